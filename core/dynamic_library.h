@@ -1,0 +1,35 @@
+// A library loaded at run time, freed by its owner's destructor. Entry points get their type from the declaration in
+// interfaces/, never from a retyped signature:
+//   auto* init = library.Resolve<decltype(&LogInit)>("LogInit");
+#pragma once
+
+#include "core/scoped.h"
+
+class DynamicLibrary {
+ public:
+  DynamicLibrary() = default;
+
+  // `name` is a bare file name (found in the program's and the system's folder only, see RestrictLibrarySearch) or a full
+  // path. Check with operator bool; the system's last error says why it failed.
+  explicit DynamicLibrary(const wchar_t* name) : m_module(LoadLibraryW(name)) {}
+
+  explicit operator bool() const { return static_cast<bool>(m_module); }
+  HMODULE Module() const { return m_module.Get(); }
+
+  // Null when the library is not loaded or has no such export.
+  template <class Function>
+  Function Resolve(const char* name) const {
+    if (!m_module) return nullptr;
+    // By way of void*: compilers warn of casts between function types.
+    return reinterpret_cast<Function>(reinterpret_cast<void*>(GetProcAddress(m_module.Get(), name)));
+  }
+
+ private:
+  ScopedModule m_module;
+};
+
+// Takes the current directory and PATH out of the library search of this process. Called once, before any thread.
+inline void RestrictLibrarySearch() {
+  SetDefaultDllDirectories(LOAD_LIBRARY_SEARCH_APPLICATION_DIR | LOAD_LIBRARY_SEARCH_SYSTEM32 |
+                           LOAD_LIBRARY_SEARCH_USER_DIRS);
+}

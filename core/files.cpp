@@ -1,0 +1,166 @@
+#include "core/files.h"
+
+#include <aclapi.h>
+#include <sddl.h>
+
+#include <algorithm>
+#include <vector>
+
+#include "core/scoped.h"
+
+namespace {
+
+constexpr std::wstring_view kLocalPrefix = L"\\\\?\\";
+constexpr std::wstring_view kNetworkPrefix = L"\\\\?\\UNC\\";
+
+bool IsDriveAbsolute(std::wstring_view path) { return path.size() >= 3 && path[1] == L':' && path[2] == L'\\'; }
+
+// Removes "." and "..", and doubled separators, from what follows the first `rootLength` characters.
+std::wstring WithoutDots(std::wstring_view path, size_t rootLength) {
+  std::vector<std::wstring_view> parts;
+  for (size_t begin = rootLength; begin < path.size();) {
+    const size_t end = std::min(path.find(L'\\', begin), path.size());
+    const std::wstring_view part = path.substr(begin, end - begin);
+    if (part == L"..") {
+      if (!parts.empty()) parts.pop_back();
+    } else if (!part.empty() && part != L".") {
+      parts.push_back(part);
+    }
+    begin = end + 1;
+  }
+  std::wstring result(path.substr(0, rootLength));
+  for (size_t i = 0; i < parts.size(); ++i) {
+    if (i != 0) result += L'\\';
+    result += parts[i];
+  }
+  return result;
+}
+
+std::wstring CurrentDirectory() {
+  std::wstring folder(GetCurrentDirectoryW(0, nullptr), L'\0');
+  folder.resize(GetCurrentDirectoryW(static_cast<DWORD>(folder.size()), folder.data()));
+  return folder;
+}
+
+// Grants the current user, the administrators and the system everything, and nobody else anything.
+std::wstring PrivateFolderDescriptor() {
+  KernelHandle token;
+  if (!OpenProcessToken(GetCurrentProcess(), TOKEN_QUERY, token.Receive())) return {};
+  DWORD size = 0;
+  GetTokenInformation(token.Get(), TokenUser, nullptr, 0, &size);
+  std::vector<std::byte> user(size);
+  if (!GetTokenInformation(token.Get(), TokenUser, user.data(), size, &size)) return {};
+  LocalMemory<wchar_t> sid;
+  if (!ConvertSidToStringSidW(reinterpret_cast<const TOKEN_USER*>(user.data())->User.Sid, sid.Receive())) return {};
+  return L"D:P(A;OICI;FA;;;SY)(A;OICI;FA;;;BA)(A;OICI;FA;;;" + std::wstring(sid.Get()) + L")";
+}
+
+DWORD WriteAll(HANDLE file, std::span<const char> bytes) {
+  constexpr size_t kChunk = size_t{16} << 20;
+  while (!bytes.empty()) {
+    const DWORD count = static_cast<DWORD>(std::min(bytes.size(), kChunk));
+    DWORD written = 0;
+    if (!WriteFile(file, bytes.data(), count, &written, nullptr)) return GetLastError();
+    if (written == 0) return ERROR_WRITE_FAULT;
+    bytes = bytes.subspan(written);
+  }
+  return FlushFileBuffers(file) ? ERROR_SUCCESS : GetLastError();
+}
+
+}  // namespace
+
+std::wstring ExtendPath(std::wstring_view path, std::wstring_view currentDirectory) {
+  if (path.empty() || path.starts_with(kLocalPrefix) || path.starts_with(L"\\\\.\\")) return std::wstring(path);
+  std::wstring full(path);
+  std::replace(full.begin(), full.end(), L'/', L'\\');
+  if (full.starts_with(L"\\\\")) {
+    return WithoutDots(std::wstring(kNetworkPrefix) + full.substr(2), kNetworkPrefix.size());
+  }
+  if (!IsDriveAbsolute(full)) {
+    if (currentDirectory.starts_with(kLocalPrefix)) currentDirectory.remove_prefix(kLocalPrefix.size());
+    if (full.starts_with(L"\\")) {  // the root of the current drive
+      full = std::wstring(currentDirectory.substr(0, 2)) + full;
+    } else {
+      full = std::wstring(currentDirectory) + L"\\" + full;
+      if (full.starts_with(L"\\\\")) return ExtendPath(full, {});
+    }
+  }
+  const std::wstring extended = std::wstring(kLocalPrefix) + full;
+  return WithoutDots(extended, kLocalPrefix.size() + 3);
+}
+
+std::wstring ExtendedPath(std::wstring_view path) {
+  // "C:name" means a current directory per drive, which only the system knows.
+  if (path.size() >= 2 && path[1] == L':' && (path.size() == 2 || (path[2] != L'\\' && path[2] != L'/'))) {
+    const std::wstring name(path);
+    std::wstring full(GetFullPathNameW(name.c_str(), 0, nullptr, nullptr), L'\0');
+    full.resize(GetFullPathNameW(name.c_str(), static_cast<DWORD>(full.size()), full.data(), nullptr));
+    return ExtendPath(full, {});
+  }
+  const bool isAbsolute = path.size() >= 3 && path[1] == L':';
+  return ExtendPath(path, isAbsolute ? std::wstring() : CurrentDirectory());
+}
+
+bool PathExists(std::wstring_view path) {
+  return GetFileAttributesW(ExtendedPath(path).c_str()) != INVALID_FILE_ATTRIBUTES;
+}
+
+bool FolderExists(std::wstring_view path) {
+  const DWORD attributes = GetFileAttributesW(ExtendedPath(path).c_str());
+  return attributes != INVALID_FILE_ATTRIBUTES && (attributes & FILE_ATTRIBUTE_DIRECTORY) != 0;
+}
+
+DWORD ReadWholeFile(std::wstring_view path, uint64_t limit, std::string& bytes) {
+  const KernelHandle file(CreateFileW(ExtendedPath(path).c_str(), GENERIC_READ, FILE_SHARE_READ | FILE_SHARE_WRITE,
+                                      nullptr, OPEN_EXISTING, FILE_FLAG_SEQUENTIAL_SCAN, nullptr));
+  if (!file) return GetLastError();
+  LARGE_INTEGER size{};
+  if (!GetFileSizeEx(file.Get(), &size)) return GetLastError();
+  if (static_cast<uint64_t>(size.QuadPart) > limit) return ERROR_FILE_TOO_LARGE;
+  bytes.resize(static_cast<size_t>(size.QuadPart));
+  size_t filled = 0;
+  while (filled < bytes.size()) {  // a file that shrinks meanwhile ends early, one that grows is cut
+    constexpr size_t kChunk = size_t{16} << 20;
+    DWORD count = 0;
+    if (!ReadFile(file.Get(), bytes.data() + filled, static_cast<DWORD>(std::min(bytes.size() - filled, kChunk)),
+                  &count, nullptr)) {
+      return GetLastError();
+    }
+    if (count == 0) break;
+    filled += count;
+  }
+  bytes.resize(filled);
+  return ERROR_SUCCESS;
+}
+
+DWORD WriteWholeFile(std::wstring_view path, std::span<const char> bytes) {
+  const std::wstring partial = ExtendedPath(path) + kPartialSuffix;
+  DWORD error = ERROR_SUCCESS;
+  {
+    const KernelHandle file(
+        CreateFileW(partial.c_str(), GENERIC_WRITE, 0, nullptr, CREATE_ALWAYS, FILE_ATTRIBUTE_NORMAL, nullptr));
+    if (!file) return GetLastError();
+    error = WriteAll(file.Get(), bytes);
+  }
+  if (error == ERROR_SUCCESS) error = PublishPartialFile(path);
+  if (error != ERROR_SUCCESS) DeleteFileW(partial.c_str());
+  return error;
+}
+
+DWORD PublishPartialFile(std::wstring_view path) {
+  const std::wstring target = ExtendedPath(path);
+  const std::wstring partial = target + kPartialSuffix;
+  return MoveFileExW(partial.c_str(), target.c_str(), MOVEFILE_REPLACE_EXISTING | MOVEFILE_WRITE_THROUGH)
+             ? ERROR_SUCCESS
+             : GetLastError();
+}
+
+DWORD CreatePrivateFolder(std::wstring_view path) {
+  LocalMemory<void> descriptor;
+  if (!ConvertStringSecurityDescriptorToSecurityDescriptorW(PrivateFolderDescriptor().c_str(), SDDL_REVISION_1,
+                                                            descriptor.Receive(), nullptr)) {
+    return GetLastError();
+  }
+  SECURITY_ATTRIBUTES attributes{sizeof attributes, descriptor.Get(), FALSE};
+  return CreateDirectoryW(ExtendedPath(path).c_str(), &attributes) ? ERROR_SUCCESS : GetLastError();
+}

@@ -1,0 +1,39 @@
+// Whole files, and paths as the system's file functions need them. Nothing here logs; a function returns 0 or the
+// Windows error number of what failed.
+#pragma once
+
+#include <windows.h>
+
+#include <cstdint>
+#include <span>
+#include <string>
+#include <string_view>
+
+// The form of a path that has no length limit and keeps trailing dots and spaces: absolute, with the prefix \\?\ (or
+// \\?\UNC\). Relative paths are resolved against the current directory, "." and ".." are removed, and "/" becomes "\".
+// Every function of this program that opens, lists or deletes by a path passes it through here. An empty path stays empty.
+std::wstring ExtendedPath(std::wstring_view path);
+
+// The same without asking the system; `currentDirectory` is absolute.
+std::wstring ExtendPath(std::wstring_view path, std::wstring_view currentDirectory);
+
+bool PathExists(std::wstring_view path);    // a file or a folder
+bool FolderExists(std::wstring_view path);  // a folder
+
+// Reads a whole file into `bytes`. ERROR_FILE_TOO_LARGE when it is longer than `limit`; nothing is read then.
+DWORD ReadWholeFile(std::wstring_view path, uint64_t limit, std::string& bytes);
+
+// Writes a whole file, replacing an older one. The bytes go to "<path>.partial", are flushed to the disk and renamed, so
+// that whatever happens no half-written file ever stands under `path`.
+DWORD WriteWholeFile(std::wstring_view path, std::span<const char> bytes);
+inline DWORD WriteWholeFile(std::wstring_view path, std::string_view bytes) {
+  return WriteWholeFile(path, std::span<const char>(bytes.data(), bytes.size()));
+}
+
+inline constexpr wchar_t kPartialSuffix[] = L".partial";
+
+// Makes a finished "<path>.partial" the file `path`, replacing an older one. On failure the partial file stays.
+DWORD PublishPartialFile(std::wstring_view path);
+
+// One level, no parents. Only the current user, the administrators and the system may enter it.
+DWORD CreatePrivateFolder(std::wstring_view path);

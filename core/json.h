@@ -1,0 +1,15 @@
+// Reading and writing JSON text. All JSON of the program goes through these functions, so that one place decides what
+// is accepted and how files look. UTF-8 in and out.
+#pragma once
+
+#include <json/value.h>
+
+#include <string>
+#include <string_view>
+
+// Comments and a UTF-8 byte-order mark are accepted and dropped. False when `text` is not a JSON document, or nests
+// deeper than 1,000 levels; `error` then holds the reader's message, several lines, and `value` is null.
+bool ParseJson(std::string_view text, Json::Value& value, std::string& error);
+
+std::string WriteStyledJson(const Json::Value& value);   // indented by 3 spaces, right margin 74 columns
+std::string WriteCompactJson(const Json::Value& value);  // one line, ended by a newline

@@ -1,0 +1,141 @@
+#include "core/logging.h"
+
+#include <atomic>
+#include <cstdarg>
+
+#include "core/format.h"
+#include "core/program_path.h"
+
+namespace logging {
+namespace {
+
+// Shared while a line is written, exclusive while the instance or the capture comes or goes: nobody is inside the
+// library when it is freed.
+SRWLOCK g_lock = SRWLOCK_INIT;
+CLogDLL* g_instance = nullptr;      // guarded by g_lock
+ErrorCapture* g_capture = nullptr;  // guarded by g_lock
+
+std::mutex g_bindMutex;
+std::weak_ptr<CLogDLL> g_shared;  // guarded by g_bindMutex
+
+// False while nobody could possibly want a line: the test that every log statement makes first.
+std::atomic<bool> g_anyListener{false};
+
+// Runs `change` while no line is being written.
+template <class Change>
+void ChangeListeners(Change change) {
+  AcquireSRWLockExclusive(&g_lock);
+  change();
+  g_anyListener = (g_instance != nullptr && g_instance->IsBound()) || g_capture != nullptr;
+  ReleaseSRWLockExclusive(&g_lock);
+}
+
+bool IsErrorOrWorse(Level level) { return static_cast<uint32_t>(level) <= static_cast<uint32_t>(Level::kError); }
+
+}  // namespace
+
+std::shared_ptr<CLogDLL> CLogDLL::Get() {
+  const std::lock_guard lock(g_bindMutex);
+  std::shared_ptr<CLogDLL> instance = g_shared.lock();
+  if (!instance) {
+    instance = std::make_shared<CLogDLL>();
+    g_shared = instance;
+  }
+  return instance;
+}
+
+CLogDLL::CLogDLL() : m_library((ProgramFolder() + L"\\log.dll").c_str()) {
+  m_init = m_library.Resolve<decltype(&LogInit)>("LogInit");
+  m_applySettings = m_library.Resolve<decltype(&LogApplySettings)>("LogApplySettings");
+  m_setSettingsFile = m_library.Resolve<decltype(&LogSetSettingsFile)>("LogSetSettingsFile");
+  m_enable = m_library.Resolve<decltype(&LogEnable)>("LogEnable");
+  m_setLevel = m_library.Resolve<decltype(&LogSetLevel)>("LogSetLevel");
+  m_setPath = m_library.Resolve<decltype(&LogSetPath)>("LogSetPath");
+  m_setType = m_library.Resolve<decltype(&LogSetType)>("LogSetType");
+  m_setMode = m_library.Resolve<decltype(&LogSetMode)>("LogSetMode");
+  m_setMaxSize = m_library.Resolve<decltype(&LogSetMaxSize)>("LogSetMaxSize");
+  m_setDepth = m_library.Resolve<decltype(&LogSetDepth)>("LogSetDepth");
+  m_write = m_library.Resolve<decltype(&LogWrite)>("LogWrite");
+  m_isEnabled = m_library.Resolve<decltype(&LogIsEnabled)>("LogIsEnabled");
+  m_monitorSettings = m_library.Resolve<decltype(&LogMonitorSettings)>("LogMonitorSettings");
+  m_getLevel = m_library.Resolve<decltype(&LogGetLevel)>("LogGetLevel");
+  m_uninitDeskMetrics = m_library.Resolve<decltype(&LogUninitDeskMetrics)>("LogUninitDeskMetrics");
+  m_trackEvent = m_library.Resolve<decltype(&LogTrackEvent)>("LogTrackEvent");
+  m_trackEventData = m_library.Resolve<decltype(&LogTrackEventData)>("LogTrackEventData");
+  m_removeModule = m_library.Resolve<decltype(&LogRemoveModule)>("LogRemoveModule");
+  if (m_init != nullptr) m_init();
+  ChangeListeners([this] { g_instance = this; });
+}
+
+CLogDLL::~CLogDLL() {
+  // A new instance may have been bound already while this one, the last reference gone, waited for its turn.
+  ChangeListeners([this] {
+    if (g_instance == this) g_instance = nullptr;
+  });
+  if (const auto deinit = m_library.Resolve<decltype(&LogDeinit)>("LogDeinit")) deinit();
+}
+
+void CLogDLL::ApplySettingsFile(const wchar_t* path) const {
+  if (m_setSettingsFile == nullptr || m_applySettings == nullptr) return;
+  m_setSettingsFile(path);
+  m_applySettings();
+}
+
+void CLogDLL::MonitorSettings() const {
+  if (m_monitorSettings != nullptr) m_monitorSettings(1);
+}
+
+bool IsEnabled() {
+  if (!g_anyListener.load(std::memory_order_relaxed)) return false;
+  AcquireSRWLockShared(&g_lock);
+  const bool enabled =
+      g_capture != nullptr || (g_instance != nullptr && g_instance->IsBound() &&
+                               (g_instance->m_isEnabled == nullptr || g_instance->m_isEnabled() != 0));
+  ReleaseSRWLockShared(&g_lock);
+  return enabled;
+}
+
+Route::Route(Level level) {
+  AcquireSRWLockShared(&g_lock);
+  m_captures = g_capture != nullptr && IsErrorOrWorse(level);
+}
+
+Route::~Route() { ReleaseSRWLockShared(&g_lock); }
+
+decltype(&LogWrite) Route::LibraryWrite() const { return g_instance == nullptr ? nullptr : g_instance->m_write; }
+
+void Route::Capture(const wchar_t* function, const wchar_t* format, ...) const {
+  va_list arguments;
+  va_start(arguments, format);
+  std::wstring text = FormatV(format, arguments);
+  va_end(arguments);
+  g_capture->Add(std::wstring(function) + L": " + text);
+}
+
+ErrorCapture::ErrorCapture() {
+  ChangeListeners([this] { g_capture = this; });
+}
+
+ErrorCapture::~ErrorCapture() {
+  ChangeListeners([] { g_capture = nullptr; });
+}
+
+void ErrorCapture::Add(std::wstring line) {
+  const std::lock_guard lock(m_mutex);
+  if (m_lines.size() < kMostLines) {
+    m_lines.push_back(std::move(line));
+  } else {
+    ++m_dropped;
+  }
+}
+
+std::vector<std::wstring> ErrorCapture::Take() {
+  const std::lock_guard lock(m_mutex);
+  std::vector<std::wstring> lines = std::exchange(m_lines, {});
+  if (const size_t dropped = std::exchange(m_dropped, 0); dropped != 0) {
+    lines.push_back(L"(" + std::to_wstring(dropped) + L" more lines)");
+  }
+  return lines;
+}
+
+}  // namespace logging
