@@ -48,15 +48,12 @@ TEST(ExtendPath, EveryKindOfPath) {
 }
 
 TEST(ExtendedPath, ResolvesAgainstTheCurrentFolderOfTheDrive) {
-  std::wstring current(GetCurrentDirectoryW(0, nullptr), L'\0');
-  current.resize(GetCurrentDirectoryW(static_cast<DWORD>(current.size()), current.data()));
   const TestFolder folder;
-  ASSERT_TRUE(SetCurrentDirectoryW(folder.Path().c_str()));
+  const CurrentFolder current(folder.Path());
   const std::wstring drive = folder.Path().substr(0, 2);
   EXPECT_EQ(ExtendedPath(L"name"), ExtendedPath(folder.Path(L"name")));
   EXPECT_EQ(ExtendedPath(drive + L"name"), ExtendedPath(folder.Path(L"name")));
   EXPECT_EQ(ExtendedPath(L"\\name"), L"\\\\?\\" + drive + L"\\name");
-  SetCurrentDirectoryW(current.c_str());
 }
 
 TEST(ReadWholeFile, LimitIsInclusiveAndNothingIsReadBeyond) {

@@ -42,7 +42,8 @@ TEST(WalkDir, PathsAreTheRootAsGivenJoinedWithNames) {
   folder.MakeFile(L"file");
   std::wstring withSlashes = folder.Path() + L"/";
   std::replace(withSlashes.begin(), withSlashes.end(), L'\\', L'/');
-  for (const std::wstring& root : {folder.Path() + L"\\", withSlashes}) {
+  const CurrentFolder current(folder.Path());
+  for (const std::wstring& root : {folder.Path() + L"\\", withSlashes, std::wstring(L".\\")}) {
     EXPECT_TRUE(WalkDir(root, [&](const qx::PathString& path, WIN32_FIND_DATAW entry) {
       EXPECT_EQ(std::wstring(path), root + L"file");
       EXPECT_STREQ(entry.cFileName, L"file");
