@@ -28,10 +28,6 @@ constexpr wchar_t kRunCollectors[] = L"systeminfo::DataCollectorImpl::RunCollect
 constexpr wchar_t kWriteJsonFile[] = L"systeminfo::DataCollectorImpl::WriteJsonFile";
 constexpr wchar_t kOutputFolderKey[] = L"output_folder";
 
-bool IsSet(const std::atomic<bool>* flag) {
-  return flag != nullptr && flag->load();
-}
-
 void WarnOfUnknownKeys(const Json::Value& document) {
   std::vector<std::string> keys;
   for (const CollectorRow& row : CollectorTable())
@@ -178,7 +174,7 @@ int DataCollectorImpl::RunCollectors(const std::atomic<bool>* cancel, const Prog
   const int total = static_cast<int>(collectors.size());
   int current = 1;
   for (const PlannedCollector& planned : collectors) {
-    if (IsSet(cancel)) {
+    if (IsCancelled(cancel)) {
       LOG_TRACE(kRunCollectors, L"cancel, early exit");
       return kRunCancelled;
     }
@@ -188,7 +184,7 @@ int DataCollectorImpl::RunCollectors(const std::atomic<bool>* cancel, const Prog
     if (progress) progress(current, total);
     ++current;
   }
-  return IsSet(cancel) ? kRunCancelled : kRunDone;
+  return IsCancelled(cancel) ? kRunCancelled : kRunDone;
 }
 
 unsigned long DataCollectorImpl::WriteJsonFile(std::wstring_view path, const Json::Value& value, bool pretty,
