@@ -45,7 +45,7 @@ TEST(NearestKey, TwoEditsAreNearAndThreeAreNot) {
   };
   for (const auto& row : rows)
     EXPECT_EQ(NearestKey(row.key, kCollectors), row.nearest) << row.key;
-  EXPECT_EQ(NearestKey(std::string(10'000'000, 's'), kCollectors), "");
+  EXPECT_EQ(NearestKey(std::string(1'000'000, 's'), kCollectors), "");
 }
 
 }  // namespace
