@@ -2,6 +2,7 @@
 
 #include <atomic>
 #include <cstdarg>
+#include <new>
 
 #include "core/format.h"
 #include "core/program_path.h"
@@ -30,7 +31,9 @@ void ChangeListeners(Change change) {
   ReleaseSRWLockExclusive(&g_lock);
 }
 
-bool IsErrorOrWorse(Level level) { return static_cast<uint32_t>(level) <= static_cast<uint32_t>(Level::kError); }
+bool IsErrorOrWorse(Level level) {
+  return static_cast<uint32_t>(level) <= static_cast<uint32_t>(Level::kError);
+}
 
 }  // namespace
 
@@ -88,9 +91,8 @@ void CLogDLL::MonitorSettings() const {
 bool IsEnabled() {
   if (!g_anyListener.load(std::memory_order_relaxed)) return false;
   AcquireSRWLockShared(&g_lock);
-  const bool enabled =
-      g_capture != nullptr || (g_instance != nullptr && g_instance->IsBound() &&
-                               (g_instance->m_isEnabled == nullptr || g_instance->m_isEnabled() != 0));
+  const bool enabled = g_capture != nullptr || (g_instance != nullptr && g_instance->IsBound() &&
+                                                (g_instance->m_isEnabled == nullptr || g_instance->m_isEnabled() != 0));
   ReleaseSRWLockShared(&g_lock);
   return enabled;
 }
@@ -100,16 +102,24 @@ Route::Route(Level level) {
   m_captures = g_capture != nullptr && IsErrorOrWorse(level);
 }
 
-Route::~Route() { ReleaseSRWLockShared(&g_lock); }
+Route::~Route() {
+  ReleaseSRWLockShared(&g_lock);
+}
 
-decltype(&LogWrite) Route::LibraryWrite() const { return g_instance == nullptr ? nullptr : g_instance->m_write; }
+decltype(&LogWrite) Route::LibraryWrite() const {
+  return g_instance == nullptr ? nullptr : g_instance->m_write;
+}
 
-void Route::Capture(const wchar_t* function, const wchar_t* format, ...) const {
+void Route::Capture(const wchar_t* function, const wchar_t* format, ...) const noexcept {
+  if (function == nullptr || format == nullptr) return;
   va_list arguments;
   va_start(arguments, format);
-  std::wstring text = FormatV(format, arguments);
+  try {
+    g_capture->Add(std::wstring(function) + L": " + FormatV(format, arguments));
+  } catch (const std::bad_alloc&) {
+    // A log line must never be what ends the program.
+  }
   va_end(arguments);
-  g_capture->Add(std::wstring(function) + L": " + text);
 }
 
 ErrorCapture::ErrorCapture() {
