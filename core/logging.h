@@ -76,11 +76,12 @@ class CLogDLL {
 // True when a line would go anywhere: the library is bound and enabled, or an ErrorCapture listens.
 bool IsEnabled();
 
-// While one lives, the formatted text of every line of level error, critical and fatal of the whole process is kept as
-// well as written, also when no library is bound. At most one at a time; made and destroyed on one thread.
+// While one lives, the formatted text of every line of the whole process that is at least as grave as `least` is kept
+// as well as written, also when no library is bound. Captures nest: each gets every line. They are destroyed in the
+// reverse order of their making.
 class ErrorCapture {
  public:
-  ErrorCapture();
+  explicit ErrorCapture(Level least = Level::kError);
   ~ErrorCapture();
   ErrorCapture(const ErrorCapture&) = delete;
   ErrorCapture& operator=(const ErrorCapture&) = delete;
@@ -93,8 +94,11 @@ class ErrorCapture {
 
  private:
   friend class Route;
-  void Add(std::wstring line);
+  bool Wants(Level level) const { return static_cast<uint32_t>(level) <= static_cast<uint32_t>(m_least); }
+  void Add(const std::wstring& line);
 
+  const Level m_least;
+  ErrorCapture* m_outer = nullptr;  // fixed once this one listens
   std::mutex m_mutex;
   std::vector<std::wstring> m_lines;
   size_t m_dropped = 0;
@@ -113,7 +117,8 @@ class Route {
   void Capture(const wchar_t* function, const wchar_t* format, ...) const noexcept;
 
  private:
-  bool m_captures;
+  Level m_level;
+  bool m_captures = false;
 };
 
 // A log argument as it passes through an ellipsis. A scoped enumeration is not promoted there as an integer is.
