@@ -2,7 +2,7 @@
 #pragma once
 
 #include <windows.h>
-// oleauto.h needs windows.h
+
 #include <oleauto.h>
 
 #include <string_view>
