@@ -77,11 +77,15 @@ struct TaskMemoryTraits {
 };
 using TaskMemoryText = Scoped<TaskMemoryTraits>;
 
+KernelHandle OpenForAttributes(const std::wstring& extended, DWORD flags) {
+  return KernelHandle(CreateFileW(extended.c_str(), FILE_READ_ATTRIBUTES,
+                                  FILE_SHARE_READ | FILE_SHARE_WRITE | FILE_SHARE_DELETE, nullptr, OPEN_EXISTING, flags,
+                                  nullptr));
+}
+
 // Where the system says the folder really is; empty when it cannot be asked.
 std::wstring FinalPath(const std::wstring& extended) {
-  const KernelHandle folder(CreateFileW(extended.c_str(), FILE_READ_ATTRIBUTES,
-                                        FILE_SHARE_READ | FILE_SHARE_WRITE | FILE_SHARE_DELETE, nullptr, OPEN_EXISTING,
-                                        FILE_FLAG_BACKUP_SEMANTICS, nullptr));
+  const KernelHandle folder = OpenForAttributes(extended, FILE_FLAG_BACKUP_SEMANTICS);
   if (!folder) return {};
   constexpr DWORD kLongestPath = 32767;
   std::wstring path(kLongestPath + 1, L'\0');
@@ -111,6 +115,14 @@ std::wstring NormalFolder(std::wstring_view folder) {
   if (extended.find(L'\0') != std::wstring::npos) return extended;
   const std::wstring final = FinalPath(extended);
   return final.starts_with(kLocalPrefix) ? final : extended;
+}
+
+bool IsFolderLink(std::wstring_view folder) {
+  const KernelHandle handle =
+      OpenForAttributes(ExtendedPath(folder), FILE_FLAG_BACKUP_SEMANTICS | FILE_FLAG_OPEN_REPARSE_POINT);
+  FILE_ATTRIBUTE_TAG_INFO info{};
+  return handle && GetFileInformationByHandleEx(handle.Get(), FileAttributeTagInfo, &info, sizeof info) &&
+         (info.FileAttributes & FILE_ATTRIBUTE_REPARSE_POINT) != 0 && IsReparseTagNameSurrogate(info.ReparseTag);
 }
 
 std::vector<ProtectedFolder> ProtectedFolders() {

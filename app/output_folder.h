@@ -20,5 +20,8 @@ std::wstring OutputFolderRefusal(std::wstring_view folder, const std::vector<Pro
 // drives and short names followed to the real place.
 std::wstring NormalFolder(std::wstring_view folder);
 
+// The folder exists and is a junction or a symbolic link: what stands in it is somebody else's.
+bool IsFolderLink(std::wstring_view folder);
+
 // The current directory, the program's, the system's and the user's own folders.
 std::vector<ProtectedFolder> ProtectedFolders();
