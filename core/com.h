@@ -34,19 +34,17 @@ struct BstrTraits {
   static void Close(BSTR text) { SysFreeString(text); }
 };
 
-class ScopedBstr : public Scoped<BstrTraits> {
- public:
-  using Scoped<BstrTraits>::Scoped;
+using ScopedBstr = Scoped<BstrTraits>;
 
-  // Invalid when there is no memory.
-  explicit ScopedBstr(std::wstring_view text)
-      : Scoped(SysAllocStringLen(text.data(), static_cast<UINT>(text.size()))) {}
+// Invalid when there is no memory.
+inline ScopedBstr MakeBstr(std::wstring_view text) {
+  return ScopedBstr(SysAllocStringLen(text.data(), static_cast<UINT>(text.size())));
+}
 
-  // A null BSTR is an empty string.
-  std::wstring_view View() const {
-    return Get() == nullptr ? std::wstring_view() : std::wstring_view(Get(), SysStringLen(Get()));
-  }
-};
+// The text of a BSTR by its own length; a null one is an empty string.
+inline std::wstring_view BstrText(BSTR text) {
+  return text == nullptr ? std::wstring_view() : std::wstring_view(text, SysStringLen(text));
+}
 
 // A VARIANT, empty at first, all of its bytes zero, and cleared by the destructor.
 class ScopedVariant {
