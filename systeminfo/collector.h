@@ -15,6 +15,11 @@ namespace systeminfo {
 
 class CollectingSettings;
 
+// Whether the run was asked to end. Null: nobody can ask.
+inline bool IsCancelled(const std::atomic<bool>* cancel) {
+  return cancel != nullptr && cancel->load();
+}
+
 class ICollector {
  public:
   // `name` is the settings key that enables the collector and the base name of its file.
@@ -35,8 +40,6 @@ class ICollector {
   const Json::Value& Data() const { return m_data; }
 
  protected:
-  static bool IsCancelled(const std::atomic<bool>* cancel) { return cancel != nullptr && cancel->load(); }
-
   std::wstring m_name;
   Json::Value m_data;
 };

@@ -12,7 +12,7 @@ std::shared_ptr<ICollector> Make(std::wstring name) {
 
 // The only list. A collector that writes the same file as an earlier one replaces it.
 constexpr CollectorRow kCollectors[] = {
-    {"system_summary", L"SystemSummary", &Make<SystemSummary>},
+    {L"system_summary", L"SystemSummary", &Make<SystemSummary>},
 };
 
 }  // namespace

@@ -10,7 +10,7 @@
 namespace systeminfo {
 
 struct CollectorRow {
-  const char* key;           // of the settings; also the collector's name. Two rows may share one.
+  const wchar_t* key;        // of the settings; also the collector's name. Two rows may share one.
   const wchar_t* className;  // for the manifest
   std::shared_ptr<ICollector> (*make)(std::wstring name);
 };

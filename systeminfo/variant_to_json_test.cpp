@@ -12,7 +12,6 @@
 namespace {
 
 using testing::ElementsAre;
-using testing::IsEmpty;
 
 struct SafeArrayTraits {
   using Type = SAFEARRAY*;
