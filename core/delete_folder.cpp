@@ -24,6 +24,12 @@ bool Remove(RemoveFunction remove, const std::wstring& path, bool force) {
   return remove(path.c_str()) != FALSE;
 }
 
+bool IsLink(const std::wstring& path) {
+  WIN32_FIND_DATAW entry;
+  const FindHandle found(FindFirstFileExW(path.c_str(), FindExInfoBasic, &entry, FindExSearchNameMatch, nullptr, 0));
+  return found && IsFolder(entry) && !IsFolderOfTree(entry);
+}
+
 // The folders from the top down to the one being emptied, on a list of its own: the call stack does not grow with the
 // depth of the tree.
 class TreeRemoval {
@@ -86,5 +92,6 @@ bool DeleteFolder(std::wstring_view folder, bool force) {
   if (IsVolumeRoot(path)) return false;
   while (path.ends_with(L'\\'))
     path.pop_back();
+  if (IsLink(path)) return Remove(RemoveDirectoryW, path, force);
   return TreeRemoval(std::move(path), force).Run();
 }

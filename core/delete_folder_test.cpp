@@ -50,11 +50,8 @@ TEST(DeleteFolder, FileInUseStaysAndEverythingElseGoes) {
 TEST(DeleteFolder, WhatIsNoFolderToDeleteIsRefused) {
   const TestFolder folder;
   folder.MakeFile(L"file");
-  std::wstring before(GetCurrentDirectoryW(0, nullptr), L'\0');
-  before.resize(GetCurrentDirectoryW(static_cast<DWORD>(before.size()), before.data()));
-  SetCurrentDirectoryW(folder.Path().c_str());
+  const CurrentFolder current(folder.Path());
   EXPECT_FALSE(DeleteFolder(L"", true));
-  SetCurrentDirectoryW(before.c_str());
   EXPECT_FALSE(DeleteFolder(folder.Path(L"missing"), true));
   EXPECT_FALSE(DeleteFolder(folder.Path(L"file"), true));
   EXPECT_TRUE(PathExists(folder.Path(L"file")));
@@ -78,6 +75,8 @@ TEST(DeleteFolder, LinkIsRemovedButNotWhatItLeadsTo) {
   folder.MakeFile(L"tree\\file");
   const FolderLink link(folder.Path(L"tree\\link"), folder.Path(L"elsewhere"));
   if (!link.Exists()) GTEST_SKIP() << "no links here";
+  const FolderLink second(folder.Path(L"second"), folder.Path(L"elsewhere"));
+  EXPECT_EQ(DeleteFolder(folder.Path(L"second"), true), link.IsRemovable());
   EXPECT_EQ(DeleteFolder(folder.Path(L"tree"), true), link.IsRemovable());
   EXPECT_EQ(PathExists(folder.Path(L"tree")), !link.IsRemovable());
   EXPECT_FALSE(PathExists(folder.Path(L"tree\\file")));

@@ -112,7 +112,6 @@ class Value {
 
   template <class Node, class... Arguments>
   static NodePtr MakeNode(const MemoryFunctions& memory, Arguments&&... arguments);
-  static NodePtr CopyNode(const BaseValue* node);
 
   void SetNumber(double value, const MemoryFunctions& memory);
   void SetBool(bool value, const MemoryFunctions& memory);

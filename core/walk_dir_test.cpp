@@ -42,7 +42,8 @@ TEST(WalkDir, PathsAreTheRootAsGivenJoinedWithNames) {
   folder.MakeFile(L"file");
   std::wstring withSlashes = folder.Path() + L"/";
   std::replace(withSlashes.begin(), withSlashes.end(), L'\\', L'/');
-  for (const std::wstring& root : {folder.Path() + L"\\", withSlashes}) {
+  const CurrentFolder current(folder.Path());
+  for (const std::wstring& root : {folder.Path() + L"\\", withSlashes, std::wstring(L".\\")}) {
     EXPECT_TRUE(WalkDir(root, [&](const qx::PathString& path, WIN32_FIND_DATAW entry) {
       EXPECT_EQ(std::wstring(path), root + L"file");
       EXPECT_STREQ(entry.cFileName, L"file");
@@ -72,14 +73,13 @@ TEST(WalkDir, BothFormsTellTheAttributesAndTheRecordTheSize) {
 
 TEST(WalkDir, StopEndsTheWalkAtOnceAndIsNoFailure) {
   const TestFolder folder;
-  for (const wchar_t* name : {L"1", L"2", L"a\\3", L"a\\4"})
+  for (const wchar_t* name : {L"a\\1", L"b\\2", L"c\\3"})
     folder.MakeFile(name);
   int calls = 0;
   EXPECT_TRUE(WalkDir(folder.Path(), [&](const qx::PathString&, uint32_t) {
-    ++calls;
-    return kWalkStop;
+    return ++calls == 2 ? kWalkStop : kWalkContinue;  // one folder is pending by then
   }));
-  EXPECT_EQ(calls, 1);
+  EXPECT_EQ(calls, 2);
 }
 
 TEST(WalkDir, FalseWhenTheRootCannotBeListed) {

@@ -69,7 +69,7 @@ class FolderLink {
     if (getName == nullptr) return {};
     char* const name = getName(path.c_str());  // on the process heap
     if (name == nullptr) return {};
-    const std::wstring copy(name, name + std::strlen(name));
+    std::wstring copy(name, name + std::strlen(name));
     HeapFree(GetProcessHeap(), 0, name);
     return copy;
   }
