@@ -221,7 +221,7 @@ void Encrypt(const std::wstring& archivePath, std::string_view publicKeyPem) {
     return;
   }
   LOG_TRACE(kScope, L"writing encrypted buffer to file");
-  if (const DWORD error = WriteWholeFile(archivePath, std::string_view(package)); error != ERROR_SUCCESS) {
+  if (const DWORD error = WriteWholeFile(archivePath, package); error != ERROR_SUCCESS) {
     LOG_ERROR(kScope, L"failed to write package %s err=%d", archivePath.c_str(), error);
     return;
   }
