@@ -21,5 +21,6 @@ TEST(ExtendPath, EveryKindOfPath) {
       {L"\\\\?\\C:\\kept\\..\\as it is", L"\\\\?\\C:\\kept\\..\\as it is"},
       {L"\\\\.\\pipe\\x", L"\\\\.\\pipe\\x"},
   };
-  for (const auto& row : rows) EXPECT_EQ(ExtendPath(row.path, L"D:\\work"), row.expected) << row.path;
+  for (const auto& row : rows)
+    EXPECT_EQ(ExtendPath(row.path, L"D:\\work"), row.expected) << row.path;
 }

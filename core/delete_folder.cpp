@@ -1,0 +1,102 @@
+#include "core/delete_folder.h"
+
+#include <windows.h>
+
+#include <algorithm>
+#include <string>
+#include <utility>
+#include <vector>
+
+#include "core/files.h"
+#include "core/folder_entries.h"
+#include "core/paths.h"
+
+namespace {
+
+using RemoveFunction = BOOL(WINAPI*)(const wchar_t*);
+
+bool Remove(RemoveFunction remove, const std::wstring& path, bool force) {
+  if (remove(path.c_str())) return true;
+  if (!force || GetLastError() != ERROR_ACCESS_DENIED) return false;
+  const DWORD attributes = GetFileAttributesW(path.c_str());
+  if (attributes != INVALID_FILE_ATTRIBUTES && (attributes & FILE_ATTRIBUTE_READONLY) != 0) {
+    SetFileAttributesW(path.c_str(), attributes & ~static_cast<DWORD>(FILE_ATTRIBUTE_READONLY));
+  }
+  return remove(path.c_str()) != FALSE;
+}
+
+bool IsRoot(std::wstring_view extendedPath) {
+  constexpr std::wstring_view kNetworkPrefix = L"\\\\?\\UNC\\";
+  constexpr std::wstring_view kLocalPrefix = L"\\\\?\\";
+  const bool isNetwork = extendedPath.starts_with(kNetworkPrefix);
+  extendedPath.remove_prefix(isNetwork ? kNetworkPrefix.size() : std::min(kLocalPrefix.size(), extendedPath.size()));
+  while (extendedPath.ends_with(L'\\'))
+    extendedPath.remove_suffix(1);
+  const auto separators = std::count(extendedPath.begin(), extendedPath.end(), L'\\');
+  return separators <= (isNetwork ? 1 : 0);  // "server\share", "C:"
+}
+
+// The folders from the top down to the one being emptied, on a list of its own: the call stack does not grow with the
+// depth of the tree.
+class TreeRemoval {
+ public:
+  TreeRemoval(std::wstring root, bool force) : m_path(std::move(root)), m_force(force) {}
+
+  bool Run() {
+    EnterCurrentFolder();
+    while (!m_levels.empty()) {
+      Level& level = m_levels.back();
+      m_path.resize(level.pathLength);
+      if (level.subfolders.empty()) {
+        m_isComplete &= Remove(RemoveDirectoryW, m_path, m_force);
+        m_levels.pop_back();
+      } else {
+        m_path += L'\\';
+        m_path += level.subfolders.back();
+        level.subfolders.pop_back();
+        EnterCurrentFolder();
+      }
+    }
+    return m_isComplete;
+  }
+
+ private:
+  struct Level {
+    size_t pathLength;
+    std::vector<std::wstring> subfolders;  // names, still to be removed
+  };
+
+  // Removes what is not a subfolder from the folder `m_path`, and notes its subfolders.
+  void EnterCurrentFolder() {
+    Level level{m_path.size(), {}};
+    m_path += L'\\';
+    const std::wstring folder = m_path;
+    ForEachEntry(folder, [&](const WIN32_FIND_DATAW& entry) {
+      if (IsFolderOfTree(entry)) {
+        level.subfolders.emplace_back(entry.cFileName);
+      } else {
+        m_path.resize(folder.size());
+        m_path += entry.cFileName;
+        m_isComplete &= Remove(IsFolder(entry) ? RemoveDirectoryW : DeleteFileW, m_path, m_force);
+      }
+      return true;
+    });  // what could not be listed keeps its folder from being removed
+    m_levels.push_back(std::move(level));
+  }
+
+  std::wstring m_path;
+  bool m_force;
+  bool m_isComplete = true;
+  std::vector<Level> m_levels;
+};
+
+}  // namespace
+
+bool DeleteFolder(std::wstring_view folder, bool force) {
+  if (folder.empty()) return false;
+  std::wstring path = ExtendedPath(JoinPath(folder, {}));  // "C:" is the root too, not the drive's current folder
+  if (IsRoot(path)) return false;
+  while (path.ends_with(L'\\'))
+    path.pop_back();
+  return TreeRemoval(std::move(path), force).Run();
+}

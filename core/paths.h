@@ -1,0 +1,13 @@
+// Rules on the text of paths; nothing here asks the system. Both separators, "\" and "/", are known.
+#pragma once
+
+#include <string_view>
+
+#include "core/path_string.h"
+
+// Adds a backslash to a base that is not empty and does not end in a separator, then `part` without its leading
+// separators.
+qx::PathString JoinPath(std::wstring_view base, std::wstring_view part);
+
+// The text behind the last separator; separators at the end are passed over. Empty for "" and "\". Points into `path`.
+std::wstring_view LastPathComponent(std::wstring_view path);

@@ -1,0 +1,45 @@
+#include "core/paths.h"
+
+#include <gtest/gtest.h>
+
+#include <string>
+
+TEST(JoinPath, PutsExactlyOneSeparatorBetween) {
+  struct {
+    const wchar_t* base;
+    const wchar_t* part;
+    const wchar_t* expected;
+  } const rows[] = {
+      {L"C:\\a", L"b", L"C:\\a\\b"},
+      {L"C:\\a\\", L"b", L"C:\\a\\b"},
+      {L"C:/a/", L"b", L"C:/a/b"},
+      {L"C:\\a", L"\\/\\b\\c", L"C:\\a\\b\\c"},
+      {L"C:\\a\\", L"//b", L"C:\\a\\b"},
+      {L"", L"b", L"b"},
+      {L"", L"\\b", L"b"},
+      {L"C:\\a", L"", L"C:\\a\\"},
+      {L"C:\\a", L"\\\\", L"C:\\a\\"},
+      {L"\\\\", L"b", L"\\\\b"},  // what the base already ends in stays
+      {L"", L"", L""},
+  };
+  for (const auto& row : rows) {
+    EXPECT_EQ(std::wstring(JoinPath(row.base, row.part)), row.expected) << row.base << " + " << row.part;
+  }
+}
+
+TEST(LastPathComponent, IsTheTextBehindTheLastSeparator) {
+  struct {
+    const wchar_t* path;
+    const wchar_t* expected;
+  } const rows[] = {
+      {L"C:\\a\\b.txt", L"b.txt"},
+      {L"C:/a/b", L"b"},
+      {L"b", L"b"},
+      {L"C:\\a\\b\\/", L"b"},
+      {L"C:\\", L"C:"},
+      {L"\\", L""},
+      {L"", L""},
+  };
+  for (const auto& row : rows)
+    EXPECT_EQ(LastPathComponent(row.path), row.expected) << row.path;
+}
