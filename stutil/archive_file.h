@@ -1,4 +1,5 @@
-// The file behind an archive while it is written: buffered, at any offset, and unseen under its final name until Publish.
+// The file behind an archive while it is written: buffered, at any offset, and unseen under its final name until
+// Publish.
 #pragma once
 
 #include <cstdint>
@@ -37,7 +38,7 @@ class ArchiveFile {
   std::wstring m_partialPath;
   KernelHandle m_file;
   DWORD m_error = ERROR_SUCCESS;
-  std::vector<char> m_buffer;   // what stands in the file from m_bufferOffset on, but was not written yet
+  std::vector<char> m_buffer;  // what stands in the file from m_bufferOffset on, but was not written yet
   uint64_t m_bufferOffset = 0;
 };
 

@@ -16,8 +16,9 @@ constexpr unsigned kEndOfBlock = 256;
 constexpr unsigned kLongestCode = 15;
 
 // Extra bits behind a length symbol (from 257) and a distance symbol. The symbols without a meaning are left out.
-constexpr uint8_t kLengthExtra[] = {0, 0, 0, 0, 0, 0, 0, 0, 1, 1, 1, 1, 2, 2, 2, 2, 3, 3, 3, 3, 4, 4, 4, 4, 5, 5, 5, 5, 0};
-constexpr uint8_t kDistanceExtra[] = {0, 0, 0, 0, 1, 1, 2,  2,  3,  3,  4,  4,  5,  5,  6,
+constexpr uint8_t kLengthExtra[] = {0, 0, 0, 0, 0, 0, 0, 0, 1, 1, 1, 1, 2, 2, 2,
+                                    2, 3, 3, 3, 3, 4, 4, 4, 4, 5, 5, 5, 5, 0};
+constexpr uint8_t kDistanceExtra[] = {0, 0, 0, 0, 1, 1, 2, 2,  3,  3,  4,  4,  5,  5,  6,
                                       6, 7, 7, 8, 8, 9, 9, 10, 10, 11, 11, 12, 12, 13, 13};
 constexpr uint8_t kCodeLengthOrder[] = {16, 17, 18, 0, 8, 7, 9, 6, 10, 5, 11, 4, 12, 3, 13, 2, 14, 1, 15};
 
@@ -65,7 +66,8 @@ class CodeTable {
   // from `firstExtra` on. False when more code words are asked for than there can be.
   bool Build(std::span<const uint8_t> lengths, std::span<const uint8_t> extra, size_t firstExtra) {
     std::array<unsigned, kLongestCode + 1> count{};
-    for (const uint8_t length : lengths) ++count[length];
+    for (const uint8_t length : lengths)
+      ++count[length];
     count[0] = 0;
     std::array<unsigned, kLongestCode + 2> next{};
     unsigned longest = 1;
@@ -94,7 +96,8 @@ class CodeTable {
  private:
   static size_t Reversed(unsigned code, unsigned length) {
     size_t reversed = 0;
-    for (unsigned bit = 0; bit < length; ++bit) reversed |= size_t{code >> bit & 1} << (length - 1 - bit);
+    for (unsigned bit = 0; bit < length; ++bit)
+      reversed |= size_t{code >> bit & 1} << (length - 1 - bit);
     return reversed;
   }
 
@@ -176,7 +179,9 @@ class BlockSkimmer {
       }
       if (symbol.value == 16 && i == 0) return false;
       const uint8_t repeated = symbol.value == 16 ? lengths[i - 1] : uint8_t{0};
-      const size_t times = symbol.value == 16 ? 3 + m_reader.Read(2) : symbol.value == 17 ? 3 + m_reader.Read(3) : 11 + m_reader.Read(7);
+      const size_t times = symbol.value == 16   ? 3 + m_reader.Read(2)
+                           : symbol.value == 17 ? 3 + m_reader.Read(3)
+                                                : 11 + m_reader.Read(7);
       if (times > count - i) return false;
       std::fill_n(lengths.begin() + static_cast<std::ptrdiff_t>(i), times, repeated);
       i += times;
@@ -211,7 +216,9 @@ class BlockSkimmer {
 
 }  // namespace
 
-std::optional<FinalBlock> FindFinalBlock(std::span<const uint8_t> stream) { return BlockSkimmer(stream).FindFinal(); }
+std::optional<FinalBlock> FindFinalBlock(std::span<const uint8_t> stream) {
+  return BlockSkimmer(stream).FindFinal();
+}
 
 bool MakeContinuable(std::vector<uint8_t>& bytes, size_t begin) {
   const auto block = FindFinalBlock(std::span<const uint8_t>(bytes).subspan(begin));

@@ -14,7 +14,9 @@ constexpr int kLevel = 6;
 
 }  // namespace
 
-void Deflater::Free::operator()(libdeflate_compressor* compressor) const { libdeflate_free_compressor(compressor); }
+void Deflater::Free::operator()(libdeflate_compressor* compressor) const {
+  libdeflate_free_compressor(compressor);
+}
 
 Deflater::Deflater() : m_compressor(libdeflate_alloc_compressor(kLevel)) {
   if (!m_compressor) throw std::bad_alloc();
@@ -31,11 +33,13 @@ bool Deflater::Append(std::span<const uint8_t> input, StreamEnd end, std::vector
   return false;
 }
 
-uint32_t Crc32(std::span<const uint8_t> bytes) { return libdeflate_crc32(0, bytes.data(), bytes.size()); }
+uint32_t Crc32(std::span<const uint8_t> bytes) {
+  return libdeflate_crc32(0, bytes.data(), bytes.size());
+}
 
 uint32_t JoinCrc32(uint32_t head, uint32_t tail, uint64_t tailLength) {
-  // A CRC is the sum (exclusive or) of a part that depends on the bytes and one that depends on what the CRC was before.
-  // Running both beginnings over the same zeros leaves the second part alone.
+  // A CRC is the sum (exclusive or) of a part that depends on the bytes and one that depends on what the CRC was
+  // before. Running both beginnings over the same zeros leaves the second part alone.
   static constexpr uint8_t kZeros[16384]{};
   uint32_t fromHead = head;
   uint32_t fromNothing = 0;

@@ -3,7 +3,7 @@
 
 #include <span>
 
-#include "stutil/pack_worker.h"
+#include "stutil/pack_job.h"
 #include "stutil/scoped_zip_archive.h"
 
 namespace stutil {
@@ -18,7 +18,8 @@ class EntryAssembler {
  public:
   explicit EntryAssembler(ScopedZipArchive& archive) : m_archive(archive) {}
 
-  // Takes the part `partIndex` of `packed`, which belongs to `file`. The pieces of a file come in order, nothing between.
+  // Takes the part `partIndex` of `packed`, which belongs to `file`. The pieces of a file come in order, nothing
+  // between.
   EntryState Add(const PackJob& job, const PackedJob& packed, size_t partIndex, const FileRecord& file);
 
  private:

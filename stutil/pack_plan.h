@@ -1,5 +1,5 @@
-// How the work of compressing a list of files is cut into jobs for several threads: runs of small files, and pieces of big
-// ones. Pure.
+// How the work of compressing a list of files is cut into jobs for several threads: runs of small files, and pieces of
+// big ones. Pure.
 #pragma once
 
 #include <cstdint>

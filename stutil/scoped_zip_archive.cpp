@@ -76,11 +76,17 @@ ScopedZipArchive::~ScopedZipArchive() {
   if (!finalized) LOG_ERROR(L"stutil::ScopedZipArchive::~ScopedZipArchive", L"error on archive finalize");
 }
 
-bool ScopedZipArchive::IsOpen() const { return m_writer != nullptr; }
+bool ScopedZipArchive::IsOpen() const {
+  return m_writer != nullptr;
+}
 
-bool ScopedZipArchive::IsBroken() const { return !m_writer || m_writer->file.Error() != ERROR_SUCCESS; }
+bool ScopedZipArchive::IsBroken() const {
+  return !m_writer || m_writer->file.Error() != ERROR_SUCCESS;
+}
 
-const std::wstring& ScopedZipArchive::PartialPath() const { return m_writer->file.PartialPath(); }
+const std::wstring& ScopedZipArchive::PartialPath() const {
+  return m_writer->file.PartialPath();
+}
 
 bool ScopedZipArchive::Add(const ZipEntry& entry, std::span<const uint8_t> deflated) {
   if (entry.size == 0) return m_writer->AddData({entry.name, entry.lastWriteTime}, nullptr, 0);

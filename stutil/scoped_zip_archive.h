@@ -1,5 +1,5 @@
-// One zip archive being written. It stands under "<path>.partial" until it is finalized, so that an archive under its final
-// name is always a whole one. Entries are handed over compressed; what is written is never read again.
+// One zip archive being written. It stands under "<path>.partial" until it is finalized, so that an archive under its
+// final name is always a whole one. Entries are handed over compressed; what is written is never read again.
 #pragma once
 
 #include <cstdint>

@@ -1,5 +1,5 @@
-// Packs folders into one zip archive of at most 50 MiB of files, the newest ones first. Files that are in use are packed as
-// they are at that moment; a file that cannot be read is tried once more through a copy beside it.
+// Packs folders into one zip archive of at most 50 MiB of files, the newest ones first. Files that are in use are
+// packed as they are at that moment; a file that cannot be read is tried once more through a copy beside it.
 #pragma once
 
 #include <string>

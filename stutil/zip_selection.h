@@ -1,4 +1,5 @@
-// Which files go into an archive, and under which names. Pure: the records come from a walk, nothing here looks at a disk.
+// Which files go into an archive, and under which names. Pure: the records come from a walk, nothing here looks at a
+// disk.
 #pragma once
 
 #include <cstdint>
@@ -11,9 +12,9 @@ namespace stutil {
 // One file that was found. Text is as short as it is, unlike a path string, which starts with room for 260 characters:
 // there can be a hundred thousand records.
 struct FileRecord {
-  std::wstring path;       // the source
-  std::wstring entryName;  // in the archive
-  uint64_t size = 0;       // bytes
+  std::wstring path;           // the source
+  std::wstring entryName;      // in the archive
+  uint64_t size = 0;           // bytes
   uint64_t lastWriteTime = 0;  // seconds since 1970-01-01 UTC
 };
 
@@ -33,6 +34,8 @@ Selection SelectWithinLimit(std::vector<FileRecord> files, uint64_t limit);
 std::wstring MakeEntryName(std::wstring_view rootName, std::wstring_view folder, std::wstring_view path);
 
 // From the system's file time, in units of 100 nanoseconds since 1601. Times before 1970 wrap around.
-constexpr uint64_t UnixTimeFromFileTime(uint64_t fileTime) { return fileTime / 10'000'000 - 11'644'473'600; }
+constexpr uint64_t UnixTimeFromFileTime(uint64_t fileTime) {
+  return fileTime / 10'000'000 - 11'644'473'600;
+}
 
 }  // namespace stutil
