@@ -2,13 +2,15 @@
 
 #include <gtest/gtest.h>
 
-#include <algorithm>
+#include <stdexcept>
 #include <string>
+#include <string_view>
 #include <vector>
 
 #include "core/files.h"
 #include "core/logging.h"
 #include "core/scoped.h"
+#include "tests/support/temporary_folder_at.h"
 #include "tests/support/test_folder.h"
 
 namespace {
@@ -16,6 +18,7 @@ namespace {
 // A run in a folder of its own, with the quickest collector and without submission.
 struct StagedRun {
   TestFolder folder;
+  TemporaryFolderAt temporaryFolder{folder.MakeFolder(L"temporary")};
   CollectParameters parameters;
   std::atomic<bool> cancel{false};
   std::vector<int> progress;
@@ -31,14 +34,14 @@ struct StagedRun {
     parameters.deleteTemporaryFolder = false;
   }
 
-  int Collect(st::FolderReadyCallback folderReady = [](const std::wstring&) { return true; }) {
+  int Collect(const st::FolderReadyCallback& folderReady = [](const std::wstring&) { return true; }) {
     return st::CollectData(
         cancel, parameters,
         [this](int current, int total) {
           EXPECT_EQ(total, 100);
           progress.push_back(current);
         },
-        [this, folderReady](const std::wstring& ready) {
+        [this, &folderReady](const std::wstring& ready) {
           readyFolders.push_back(ready);
           return folderReady(ready);
         });

@@ -89,7 +89,7 @@ std::wstring GetUserTempPath() {
 }
 
 std::wstring CopyInstallLogs(const std::wstring& outputFolder) {
-  const std::wstring target(JoinPath(outputFolder, L"install_logs"));
+  std::wstring target(JoinPath(outputFolder, L"install_logs"));
   if (FolderExists(target)) DeleteFolder(target, true);
   if (!CreateDirectoryW(ExtendedPath(target).c_str(), nullptr)) {
     LOG_ERROR(kCopyInstallLogs, L"can't create install logs folder");

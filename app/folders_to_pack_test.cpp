@@ -1,7 +1,5 @@
 #include "app/folders_to_pack.h"
 
-#include <windows.h>
-
 #include <gtest/gtest.h>
 
 #include <string>
@@ -9,24 +7,10 @@
 
 #include "core/files.h"
 #include "core/logging.h"
+#include "tests/support/temporary_folder_at.h"
 #include "tests/support/test_folder.h"
 
 namespace {
-
-// The temporary folder of the process is another one while this lives.
-class TemporaryFolderAt {
- public:
-  explicit TemporaryFolderAt(const std::wstring& folder) {
-    m_old.resize(GetEnvironmentVariableW(L"TMP", m_old.data(), static_cast<DWORD>(m_old.size())));
-    SetEnvironmentVariableW(L"TMP", folder.c_str());
-  }
-  ~TemporaryFolderAt() { SetEnvironmentVariableW(L"TMP", m_old.c_str()); }
-  TemporaryFolderAt(const TemporaryFolderAt&) = delete;
-  TemporaryFolderAt& operator=(const TemporaryFolderAt&) = delete;
-
- private:
-  std::wstring m_old = std::wstring(MAX_PATH, L'\0');
-};
 
 std::string Content(const std::wstring& path) {
   std::string bytes;

@@ -111,9 +111,9 @@ std::wstring OutputFolderRefusal(std::wstring_view folder, const std::vector<Pro
 }
 
 std::wstring NormalFolder(std::wstring_view folder) {
-  const std::wstring extended = ExtendedPath(folder);
+  std::wstring extended = ExtendedPath(folder);
   if (extended.find(L'\0') != std::wstring::npos) return extended;
-  const std::wstring final = FinalPath(extended);
+  std::wstring final = FinalPath(extended);
   return final.starts_with(kLocalPrefix) ? final : extended;
 }
 
