@@ -25,7 +25,7 @@ class Logging : public testing::Test {
   }
   std::string Run(const std::wstring& arguments) const {
     ChildProcess child(L"\"" + m_folder.Path(L"tool.exe") + L"\" " + arguments);
-    const std::string output = child.ReadAll();
+    std::string output = child.ReadAll();
     EXPECT_EQ(child.Wait(), 0u);
     return output;
   }

@@ -177,6 +177,7 @@ TEST_F(Library, EventsAreCountedUntilTheirCountsAreWritten) {
 TEST_F(Library, ThreadsWriteWholeLinesInTheOrderOfTheirTimes) {
   m_log.LogSetMaxSize(100000);  // rotation goes on below them
   std::vector<std::thread> threads;
+  threads.reserve(8);
   for (int t = 0; t < 8; ++t) {
     threads.emplace_back([this, t] {
       for (int i = 0; i < 500; ++i)

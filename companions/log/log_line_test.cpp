@@ -42,7 +42,7 @@ TEST(FormatLine, NamesCannotBreakTheLine) {
 
 TEST(FormatLine, DeepScopesStopMovingRight) {
   EXPECT_EQ(Formatted("t", "f", 2).substr(51), "[f]     t\r\n");
-  EXPECT_EQ(Formatted("t", "f", 1000000).size(), Formatted("t", "f").size() + kIndentWidth * kMostIndents);
+  EXPECT_EQ(Formatted("t", "f", 1000000).size(), Formatted("t", "f").size() + size_t{kIndentWidth} * kMostIndents);
 }
 
 TEST(FormatLine, AnEndlessTextIsCutBetweenCharactersAndSaysSo) {

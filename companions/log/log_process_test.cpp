@@ -72,6 +72,7 @@ TEST_F(Processes, SeveralAtOnceLoseAndMixNothing) {
   m_folder.MakeFile(L"Logger.xml",
                     "<configuration path='logs'><maxSize>60 KB</maxSize><oldFiles>20</oldFiles></configuration>");
   std::vector<std::unique_ptr<ChildProcess>> children;
+  children.reserve(4);
   for (int i = 0; i < 4; ++i)
     children.push_back(Start(L"threads 500"));
   for (const auto& child : children)

@@ -12,6 +12,7 @@
 struct LogLibrary {
   DynamicLibrary library{(ProgramFolder() + L"\\log.dll").c_str()};
 
+// NOLINTNEXTLINE(bugprone-macro-parentheses): the name declares a member
 #define ST_EXPORT(name) decltype(&::name) name = library.Resolve<decltype(&::name)>(#name)
   ST_EXPORT(LogInit);
   ST_EXPORT(LogDeinit);

@@ -21,7 +21,7 @@ HMODULE ReferenceToOwnModule() {
 
 }  // namespace
 
-SettingsWatcher::SettingsWatcher(std::wstring path, Changed changed)
+SettingsWatcher::SettingsWatcher(const std::wstring& path, Changed changed)
     : m_folder(path.substr(0, path.find_last_of(L'\\'))),
       m_changed(std::move(changed)),
       m_stop(CreateEventW(nullptr, TRUE, FALSE, nullptr)) {

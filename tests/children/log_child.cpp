@@ -29,6 +29,7 @@ void WriteLines(int count, bool report) {
 
 void WriteFromThreads(int count) {
   std::vector<std::thread> threads;
+  threads.reserve(4);
   for (int i = 0; i < 4; ++i)
     threads.emplace_back(WriteLines, count, false);
   for (std::thread& thread : threads)
