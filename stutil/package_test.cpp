@@ -39,7 +39,7 @@ std::string Sealed(std::string_view plain) {
 }
 
 // With line breaks after every 64 characters of the body, as tools write PEM.
-std::string WithLineBreaks(std::string pem, std::string_view lineEnd) {
+std::string WithLineBreaks(const std::string& pem, std::string_view lineEnd) {
   const size_t bodyBegin = pem.find("-----", 5) + 5;
   const size_t bodyEnd = pem.rfind("-----END");
   std::string result = pem.substr(0, bodyBegin);
