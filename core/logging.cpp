@@ -2,6 +2,7 @@
 
 #include <atomic>
 #include <cstdarg>
+#include <new>
 
 #include "core/format.h"
 #include "core/program_path.h"
@@ -86,9 +87,8 @@ void CLogDLL::MonitorSettings() const {
 bool IsEnabled() {
   if (!g_anyListener.load(std::memory_order_relaxed)) return false;
   AcquireSRWLockShared(&g_lock);
-  const bool enabled =
-      g_capture != nullptr || (g_instance != nullptr && g_instance->IsBound() &&
-                               (g_instance->m_isEnabled == nullptr || g_instance->m_isEnabled() != 0));
+  const bool enabled = g_capture != nullptr || (g_instance != nullptr && g_instance->IsBound() &&
+                                                (g_instance->m_isEnabled == nullptr || g_instance->m_isEnabled() != 0));
   ReleaseSRWLockShared(&g_lock);
   return enabled;
 }
@@ -100,18 +100,27 @@ Route::Route(Level level) : m_level(level) {
   }
 }
 
-Route::~Route() { ReleaseSRWLockShared(&g_lock); }
+Route::~Route() {
+  ReleaseSRWLockShared(&g_lock);
+}
 
-decltype(&LogWrite) Route::LibraryWrite() const { return g_instance == nullptr ? nullptr : g_instance->m_write; }
+decltype(&LogWrite) Route::LibraryWrite() const {
+  return g_instance == nullptr ? nullptr : g_instance->m_write;
+}
 
-void Route::Capture(const wchar_t* function, const wchar_t* format, ...) const {
+void Route::Capture(const wchar_t* function, const wchar_t* format, ...) const noexcept {
+  if (function == nullptr || format == nullptr) return;
   va_list arguments;
   va_start(arguments, format);
-  const std::wstring line = std::wstring(function) + L": " + FormatV(format, arguments);
-  va_end(arguments);
-  for (ErrorCapture* capture = g_capture; capture != nullptr; capture = capture->m_outer) {
-    if (capture->Wants(m_level)) capture->Add(line);
+  try {
+    const std::wstring line = std::wstring(function) + L": " + FormatV(format, arguments);
+    for (ErrorCapture* capture = g_capture; capture != nullptr; capture = capture->m_outer) {
+      if (capture->Wants(m_level)) capture->Add(line);
+    }
+  } catch (const std::bad_alloc&) {
+    // A log line must never be what ends the program.
   }
+  va_end(arguments);
 }
 
 ErrorCapture::ErrorCapture(Level least) : m_least(least) {

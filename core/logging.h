@@ -114,12 +114,22 @@ class Route {
 
   decltype(&LogWrite) LibraryWrite() const;  // null when no library is bound
   bool Captures() const { return m_captures; }
-  void Capture(const wchar_t* function, const wchar_t* format, ...) const;
+  void Capture(const wchar_t* function, const wchar_t* format, ...) const noexcept;
 
  private:
   Level m_level;
   bool m_captures = false;
 };
+
+// A log argument as it passes through an ellipsis. A scoped enumeration is not promoted there as an integer is.
+template <class Argument>
+auto Promoted(Argument argument) {
+  if constexpr (std::is_enum_v<Argument>) {
+    return +static_cast<std::underlying_type_t<Argument>>(argument);
+  } else {
+    return argument;
+  }
+}
 
 // Writes one line, whatever IsEnabled says. What may stand for a printf conversion is a number, an enumeration or a
 // pointer: a std::wstring cannot pass by mistake.
@@ -130,9 +140,9 @@ void Write(int16_t step, Level level, const wchar_t* function, const wchar_t* fo
   const Route route(level);
   if (const auto write = route.LibraryWrite()) {
     const LogRecord record{static_cast<uint32_t>(level)};
-    write(step, &record, GetModuleHandleW(nullptr), function, format, arguments...);
+    write(step, &record, GetModuleHandleW(nullptr), function, format, Promoted(arguments)...);
   }
-  if (route.Captures()) route.Capture(function, format, arguments...);
+  if (route.Captures()) route.Capture(function, format, Promoted(arguments)...);
 }
 
 }  // namespace logging
