@@ -158,8 +158,12 @@ DWORD PartialFile::Write(std::string_view bytes) {
   return WriteAll(m_file.Get(), bytes);
 }
 
+DWORD PartialFile::Flush() {
+  return FlushFileBuffers(m_file.Get()) ? ERROR_SUCCESS : GetLastError();
+}
+
 DWORD PartialFile::Publish() {
-  if (!FlushFileBuffers(m_file.Get())) return GetLastError();
+  if (const DWORD flushError = Flush(); flushError != ERROR_SUCCESS) return flushError;
   m_file.Reset();
   const DWORD error = PublishPartialFile(m_path);
   if (error == ERROR_SUCCESS) m_isCreated = false;

@@ -42,6 +42,7 @@ class PartialFile {
 
   DWORD Create();  // first
   DWORD Write(std::string_view bytes);
+  DWORD Flush();    // what was written so far, so that Publish has less to wait for
   DWORD Publish();  // last; flushes to the disk, closes and renames
 
  private:

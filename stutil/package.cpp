@@ -4,14 +4,12 @@
 #include <new>
 #include <vector>
 
-#include "core/files.h"
-#include "core/logging.h"
 #include "stutil/package_format.h"
+#include "stutil/package_sealer.h"
 
 namespace stutil {
 namespace {
 
-constexpr wchar_t kScope[] = L"stutil::Encrypt";
 constexpr wchar_t kProviderName[] = L"Microsoft Base Cryptographic Provider v1.0";
 constexpr size_t kSaltSize = 11;  // of a 40-bit key: key and salt are 16 bytes together
 
@@ -87,30 +85,17 @@ DWORD GenerateSessionKey(HCRYPTPROV provider, CryptoKey& key) {
   return ERROR_SUCCESS;
 }
 
-DWORD Seal(HCRYPTKEY publicKey, HCRYPTKEY sessionKey, std::string_view plain, std::string& package) {
+// The length of the wrapped session key and the wrapped session key.
+DWORD WriteHead(HCRYPTKEY publicKey, HCRYPTKEY sessionKey, std::string& head) {
   DWORD blobLength = 0;
   if (!CryptExportKey(sessionKey, publicKey, SIMPLEBLOB, CRYPT_OAEP, nullptr, &blobLength)) return FailedCall();
-  const DWORD plainLength = static_cast<DWORD>(plain.size());
-  DWORD cipherLength = plainLength;
-  if (!CryptEncrypt(sessionKey, 0, TRUE, 0, nullptr, &cipherLength, plainLength)) return FailedCall();
-
-  const size_t cipherOffset = kKeyBlobLengthSize + blobLength;
-  package.reserve(cipherOffset + cipherLength);
-  package = PackageHeader(blobLength);
-  package.resize(cipherOffset);
-  package += plain;
-  package.resize(cipherOffset + cipherLength);
-
+  head = PackageHeader(blobLength);
+  head.resize(kKeyBlobLengthSize + blobLength);
   DWORD exported = blobLength;
-  BYTE* const bytes = reinterpret_cast<BYTE*>(package.data());
-  if (!CryptExportKey(sessionKey, publicKey, SIMPLEBLOB, CRYPT_OAEP, bytes + kKeyBlobLengthSize, &exported)) {
-    return FailedCall();
-  }
-  if (exported != blobLength) return static_cast<DWORD>(NTE_BAD_LEN);  // the package would not split where it says
-  DWORD encrypted = plainLength;
-  if (!CryptEncrypt(sessionKey, 0, TRUE, 0, bytes + cipherOffset, &encrypted, cipherLength)) return FailedCall();
-  package.resize(cipherOffset + encrypted);
-  return ERROR_SUCCESS;
+  BYTE* const blob = reinterpret_cast<BYTE*>(head.data()) + kKeyBlobLengthSize;
+  if (!CryptExportKey(sessionKey, publicKey, SIMPLEBLOB, CRYPT_OAEP, blob, &exported)) return FailedCall();
+  // Otherwise the package would not split where it says.
+  return exported == blobLength ? ERROR_SUCCESS : static_cast<DWORD>(NTE_BAD_LEN);
 }
 
 DWORD Open(HCRYPTPROV provider, HCRYPTKEY privateKey, const PackageParts& parts, std::string& plain) {
@@ -159,17 +144,33 @@ DWORD ImportPrivateKey(HCRYPTPROV provider, std::string_view pem, CryptoKey& key
   return CryptImportKey(provider, blob.Data(), blob.Size(), 0, 0, key.Receive()) ? ERROR_SUCCESS : FailedCall();
 }
 
+DWORD PackageSealer::Begin(std::string_view publicKeyPem, std::string& head) {
+  DWORD error = OpenProvider(m_provider);
+  if (error == ERROR_SUCCESS) error = ImportPublicKey(m_provider.Get(), publicKeyPem, m_publicKey);
+  if (error == ERROR_SUCCESS) error = GenerateSessionKey(m_provider.Get(), m_sessionKey);
+  if (error == ERROR_SUCCESS) error = WriteHead(m_publicKey.Get(), m_sessionKey.Get(), head);
+  return error;
+}
+
+DWORD PackageSealer::EncryptInPlace(char* bytes, size_t count, bool isLast) const {
+  if (count > MAXDWORD) return ERROR_FILE_TOO_LARGE;
+  const DWORD length = static_cast<DWORD>(count);
+  DWORD encrypted = length;
+  // A stream cipher: the buffer need not be larger than the plain bytes.
+  if (!CryptEncrypt(m_sessionKey.Get(), 0, isLast, 0, reinterpret_cast<BYTE*>(bytes), &encrypted, length)) {
+    return FailedCall();
+  }
+  return encrypted == length ? ERROR_SUCCESS : static_cast<DWORD>(NTE_BAD_LEN);
+}
+
 DWORD EncryptBuffer(std::string_view publicKeyPem, std::string_view plain, std::string& package) {
-  return FillOrEmpty(package, [&]() -> DWORD {
-    if (plain.size() > MAXDWORD) return ERROR_FILE_TOO_LARGE;
-    CryptoProvider provider;
-    CryptoKey publicKey;
-    CryptoKey sessionKey;
-    DWORD error = OpenProvider(provider);
-    if (error == ERROR_SUCCESS) error = ImportPublicKey(provider.Get(), publicKeyPem, publicKey);
-    if (error == ERROR_SUCCESS) error = GenerateSessionKey(provider.Get(), sessionKey);
-    if (error == ERROR_SUCCESS) error = Seal(publicKey.Get(), sessionKey.Get(), plain, package);
-    return error;
+  return FillOrEmpty(package, [&] {
+    PackageSealer sealer;
+    std::string head;
+    if (const DWORD error = sealer.Begin(publicKeyPem, head); error != ERROR_SUCCESS) return error;
+    package.reserve(head.size() + plain.size());
+    package.append(head).append(plain);
+    return sealer.EncryptInPlace(package.data() + head.size(), plain.size(), true);
   });
 }
 
@@ -185,47 +186,6 @@ DWORD DecryptBuffer(std::string_view privateKeyPem, std::string_view package, st
     if (!parts) return static_cast<DWORD>(NTE_BAD_DATA);
     return Open(provider.Get(), privateKey.Get(), *parts, plain);
   });
-}
-
-namespace {
-
-// Reads the archive and deletes it, even when it could not be read. False when there is nothing to encrypt.
-bool TakeArchive(const std::wstring& path, std::string& bytes) {
-  const DWORD readError = FillOrEmpty(bytes, [&] { return ReadWholeFile(path, MAXDWORD, bytes); });
-  if (readError != ERROR_SUCCESS) {
-    LOG_ERROR(kScope, L"failed to read compressed file %s err=%d", path.c_str(), readError);
-    if (!PathExists(path)) return false;
-  }
-  const DWORD deleteError = DeleteFileW(ExtendedPath(path).c_str()) ? ERROR_SUCCESS : GetLastError();
-  if (deleteError != ERROR_SUCCESS) {
-    LOG_WARNING(kScope, L"failed to remove compressed file %s err=%d", path.c_str(), deleteError);
-  } else if (readError == ERROR_SUCCESS) {
-    LOG_TRACE(kScope, L"compressed file was deleted after being read into memory");
-  }
-  return readError == ERROR_SUCCESS;
-}
-
-}  // namespace
-
-void Encrypt(const std::wstring& archivePath) {
-  Encrypt(archivePath, GetBuiltInPublicKey());
-}
-
-void Encrypt(const std::wstring& archivePath, std::string_view publicKeyPem) {
-  LOG_TRACE(kScope, L"-> encrypt");
-  std::string plain;
-  if (!TakeArchive(archivePath, plain)) return;
-  std::string package;
-  if (const DWORD error = EncryptBuffer(publicKeyPem, plain, package); error != ERROR_SUCCESS) {
-    LOG_ERROR(kScope, L"Encrypt failed with %d", error);
-    return;
-  }
-  LOG_TRACE(kScope, L"writing encrypted buffer to file");
-  if (const DWORD error = WriteWholeFile(archivePath, package); error != ERROR_SUCCESS) {
-    LOG_ERROR(kScope, L"failed to write package %s err=%d", archivePath.c_str(), error);
-    return;
-  }
-  LOG_TRACE(kScope, L"<- encrypt");
 }
 
 }  // namespace stutil

@@ -39,7 +39,7 @@ std::string Sealed(std::string_view plain) {
 }
 
 // With line breaks after every 64 characters of the body, as tools write PEM.
-std::string WithLineBreaks(std::string pem, std::string_view lineEnd) {
+std::string WithLineBreaks(const std::string& pem, std::string_view lineEnd) {
   const size_t bodyBegin = pem.find("-----", 5) + 5;
   const size_t bodyEnd = pem.rfind("-----END");
   std::string result = pem.substr(0, bodyBegin);
@@ -185,20 +185,23 @@ TEST(BuiltInPublicKey, IsOneLineWithItsTerminatingZeroAndEncrypts) {
 
 TEST(Encrypt, ReplacesTheArchiveByItsPackage) {
   const TestFolder folder;
-  const std::string plain = SomeBytes(100'000);
-  const std::wstring path = folder.MakeFile(L"collected \u00e4.zip", plain);
-  logging::ErrorCapture capture(logging::Level::kTrace);
-  stutil::Encrypt(path, kPublicKey);
-  EXPECT_THAT(capture.Take(),
-              ElementsAre(L"stutil::Encrypt: -> encrypt",
-                          L"stutil::Encrypt: compressed file was deleted after being read into memory",
-                          L"stutil::Encrypt: writing encrypted buffer to file", L"stutil::Encrypt: <- encrypt"));
-  std::string package;
-  std::string back;
-  ASSERT_EQ(ReadWholeFile(path, 1 << 20, package), 0u);
-  ASSERT_EQ(DecryptBuffer(kPrivateKey, package, back), 0u);
-  EXPECT_TRUE(back == plain);
-  EXPECT_FALSE(PathExists(path + kPartialSuffix));
+  for (const size_t size : {0, 1, (9 << 20) + 1}) {  // the last one is written in several pieces
+    const std::string plain = SomeBytes(size);
+    const std::wstring path = folder.MakeFile(L"collected \u00e4.zip", plain);
+    logging::ErrorCapture capture(logging::Level::kTrace);
+    stutil::Encrypt(path, kPublicKey);
+    EXPECT_THAT(capture.Take(),
+                ElementsAre(L"stutil::Encrypt: -> encrypt",
+                            L"stutil::Encrypt: compressed file was deleted after being read into memory",
+                            L"stutil::Encrypt: writing encrypted buffer to file", L"stutil::Encrypt: <- encrypt"));
+    std::string package;
+    std::string back;
+    ASSERT_EQ(ReadWholeFile(path, 64 << 20, package), 0u);
+    EXPECT_EQ(package.size(), kHeadSize + size);
+    ASSERT_EQ(DecryptBuffer(kPrivateKey, package, back), 0u);
+    EXPECT_TRUE(back == plain) << size;
+    EXPECT_FALSE(PathExists(path + kPartialSuffix));
+  }
 }
 
 TEST(Encrypt, LeavesNoFileWhenEncryptingFails) {

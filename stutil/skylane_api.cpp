@@ -10,6 +10,8 @@ struct EntryPoint {
   const char* name;
   Function SkylaneApi::*member;
 };
+template <class Function>
+EntryPoint(const char*, Function SkylaneApi::*) -> EntryPoint<Function>;
 
 // The only list; in the order of the table.
 constexpr std::tuple kEntryPoints{

@@ -138,6 +138,7 @@ TEST_F(QxlinkTest, UploadsAtTheSameMomentDoNotCollide) {
   ASSERT_EQ(Start(R"({"outbox": "out"})"), QXSKYLANE_OK);
   const std::wstring source = m_folder.MakeFile(L"a.zip", "bytes");
   std::vector<std::thread> threads;
+  threads.reserve(4);
   for (int i = 0; i < 4; ++i) {
     threads.emplace_back([&] {
       for (int k = 0; k < 3; ++k)
