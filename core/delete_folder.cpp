@@ -2,7 +2,6 @@
 
 #include <windows.h>
 
-#include <algorithm>
 #include <string>
 #include <utility>
 #include <vector>
@@ -25,15 +24,10 @@ bool Remove(RemoveFunction remove, const std::wstring& path, bool force) {
   return remove(path.c_str()) != FALSE;
 }
 
-bool IsRoot(std::wstring_view extendedPath) {
-  constexpr std::wstring_view kNetworkPrefix = L"\\\\?\\UNC\\";
-  constexpr std::wstring_view kLocalPrefix = L"\\\\?\\";
-  const bool isNetwork = extendedPath.starts_with(kNetworkPrefix);
-  extendedPath.remove_prefix(isNetwork ? kNetworkPrefix.size() : std::min(kLocalPrefix.size(), extendedPath.size()));
-  while (extendedPath.ends_with(L'\\'))
-    extendedPath.remove_suffix(1);
-  const auto separators = std::count(extendedPath.begin(), extendedPath.end(), L'\\');
-  return separators <= (isNetwork ? 1 : 0);  // "server\share", "C:"
+bool IsLink(const std::wstring& path) {
+  WIN32_FIND_DATAW entry;
+  const FindHandle found(FindFirstFileExW(path.c_str(), FindExInfoBasic, &entry, FindExSearchNameMatch, nullptr, 0));
+  return found && IsFolder(entry) && !IsFolderOfTree(entry);
 }
 
 // The folders from the top down to the one being emptied, on a list of its own: the call stack does not grow with the
@@ -95,8 +89,9 @@ class TreeRemoval {
 bool DeleteFolder(std::wstring_view folder, bool force) {
   if (folder.empty()) return false;
   std::wstring path = ExtendedPath(JoinPath(folder, {}));  // "C:" is the root too, not the drive's current folder
-  if (IsRoot(path)) return false;
+  if (IsVolumeRoot(path)) return false;
   while (path.ends_with(L'\\'))
     path.pop_back();
+  if (IsLink(path)) return Remove(RemoveDirectoryW, path, force);
   return TreeRemoval(std::move(path), force).Run();
 }

@@ -55,14 +55,14 @@ std::wstring PrivateFolderDescriptor() {
   return L"D:P(A;OICI;FA;;;SY)(A;OICI;FA;;;BA)(A;OICI;FA;;;" + std::wstring(sid.Get()) + L")";
 }
 
-DWORD WriteAll(HANDLE file, std::span<const char> bytes) {
+DWORD WriteAll(HANDLE file, std::string_view bytes) {
   constexpr size_t kChunk = size_t{16} << 20;
   while (!bytes.empty()) {
     const DWORD count = static_cast<DWORD>(std::min(bytes.size(), kChunk));
     DWORD written = 0;
     if (!WriteFile(file, bytes.data(), count, &written, nullptr)) return GetLastError();
     if (written == 0) return ERROR_WRITE_FAULT;
-    bytes = bytes.subspan(written);
+    bytes.remove_prefix(written);
   }
   return FlushFileBuffers(file) ? ERROR_SUCCESS : GetLastError();
 }
@@ -133,7 +133,7 @@ DWORD ReadWholeFile(std::wstring_view path, uint64_t limit, std::string& bytes) 
   return ERROR_SUCCESS;
 }
 
-DWORD WriteWholeFile(std::wstring_view path, std::span<const char> bytes) {
+DWORD WriteWholeFile(std::wstring_view path, std::string_view bytes) {
   const std::wstring partial = ExtendedPath(path) + kPartialSuffix;
   DWORD error = ERROR_SUCCESS;
   {

@@ -5,7 +5,6 @@
 #include <windows.h>
 
 #include <cstdint>
-#include <span>
 #include <string>
 #include <string_view>
 
@@ -25,10 +24,7 @@ DWORD ReadWholeFile(std::wstring_view path, uint64_t limit, std::string& bytes);
 
 // Writes a whole file, replacing an older one. The bytes go to "<path>.partial", are flushed to the disk and renamed, so
 // that whatever happens no half-written file ever stands under `path`.
-DWORD WriteWholeFile(std::wstring_view path, std::span<const char> bytes);
-inline DWORD WriteWholeFile(std::wstring_view path, std::string_view bytes) {
-  return WriteWholeFile(path, std::span<const char>(bytes.data(), bytes.size()));
-}
+DWORD WriteWholeFile(std::wstring_view path, std::string_view bytes);
 
 inline constexpr wchar_t kPartialSuffix[] = L".partial";
 

@@ -11,3 +11,6 @@ qx::PathString JoinPath(std::wstring_view base, std::wstring_view part);
 
 // The text behind the last separator; separators at the end are passed over. Empty for "" and "\". Points into `path`.
 std::wstring_view LastPathComponent(std::wstring_view path);
+
+// For an ExtendedPath: the root of a drive, a volume or a network share, with or without separators at the end.
+bool IsVolumeRoot(std::wstring_view extendedPath);

@@ -43,3 +43,23 @@ TEST(LastPathComponent, IsTheTextBehindTheLastSeparator) {
   for (const auto& row : rows)
     EXPECT_EQ(LastPathComponent(row.path), row.expected) << row.path;
 }
+
+TEST(IsVolumeRoot, KnowsDrivesVolumesAndShares) {
+  struct {
+    const wchar_t* path;
+    bool isRoot;
+  } const rows[] = {
+      {L"\\\\?\\C:\\", true},
+      {L"\\\\?\\C:", true},
+      {L"\\\\?\\C:\\a", false},
+      {L"\\\\?\\C:\\a\\", false},
+      {L"\\\\?\\Volume{4c1b02c1-d990-11dc-99ae-806e6f6e6963}\\", true},
+      {L"\\\\?\\UNC\\server\\share", true},
+      {L"\\\\?\\UNC\\server\\share\\", true},
+      {L"\\\\?\\UNC\\server\\share\\a", false},
+      {L"\\\\?\\", true},
+      {L"", true},
+  };
+  for (const auto& row : rows)
+    EXPECT_EQ(IsVolumeRoot(row.path), row.isRoot) << row.path;
+}

@@ -41,7 +41,7 @@ class StringT {
   StringT(View text) : StringT(text, 0) {}
   StringT(const StringT& other) : StringT(View(other), other.capacity()) {}
   StringT(StringT&& other) noexcept : m_buffer(std::exchange(other.m_buffer, nullptr)) {}
-  StringT& operator=(const StringT& other) { return assign(other); }
+  StringT& operator=(const StringT& other) { return this == &other ? *this : assign(other); }
   StringT& operator=(StringT&& other) noexcept {
     StringT(std::move(other)).swap(*this);
     return *this;

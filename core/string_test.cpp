@@ -84,7 +84,7 @@ TEST(String, DamagedGuardThrowsAtTheNextAccess) {
   qx::String underrun(L"text");
   Stray(underrun)[-1] = 0;
   EXPECT_THROW((void)std::wstring_view(underrun), qx::StringGuardException);
-  EXPECT_THROW(qx::String copy(underrun), qx::StringGuardException);
+  EXPECT_THROW(static_cast<void>(qx::String(underrun)), qx::StringGuardException);
 }
 
 TEST(PathString, HoldsPathsOf260CharactersBeforeItGrows) {

@@ -2,6 +2,7 @@
 
 #include <gtest/gtest.h>
 
+#include <algorithm>
 #include <set>
 #include <string>
 
@@ -41,7 +42,8 @@ TEST(WalkDir, PathsAreTheRootAsGivenJoinedWithNames) {
   folder.MakeFile(L"file");
   std::wstring withSlashes = folder.Path() + L"/";
   std::replace(withSlashes.begin(), withSlashes.end(), L'\\', L'/');
-  for (const std::wstring& root : {folder.Path() + L"\\", withSlashes}) {
+  const CurrentFolder current(folder.Path());
+  for (const std::wstring& root : {folder.Path() + L"\\", withSlashes, std::wstring(L".\\")}) {
     EXPECT_TRUE(WalkDir(root, [&](const qx::PathString& path, WIN32_FIND_DATAW entry) {
       EXPECT_EQ(std::wstring(path), root + L"file");
       EXPECT_STREQ(entry.cFileName, L"file");
@@ -71,14 +73,13 @@ TEST(WalkDir, BothFormsTellTheAttributesAndTheRecordTheSize) {
 
 TEST(WalkDir, StopEndsTheWalkAtOnceAndIsNoFailure) {
   const TestFolder folder;
-  for (const wchar_t* name : {L"1", L"2", L"a\\3", L"a\\4"})
+  for (const wchar_t* name : {L"a\\1", L"b\\2", L"c\\3"})
     folder.MakeFile(name);
   int calls = 0;
   EXPECT_TRUE(WalkDir(folder.Path(), [&](const qx::PathString&, uint32_t) {
-    ++calls;
-    return kWalkStop;
+    return ++calls == 2 ? kWalkStop : kWalkContinue;  // one folder is pending by then
   }));
-  EXPECT_EQ(calls, 1);
+  EXPECT_EQ(calls, 2);
 }
 
 TEST(WalkDir, FalseWhenTheRootCannotBeListed) {
@@ -122,7 +123,8 @@ TEST(WalkDir, LongPathsAndNamesThatEndInADotAreReached) {
 TEST(WalkDir, LinksAreVisitedButNotEntered) {
   const TestFolder folder;
   folder.MakeFile(L"a\\file");
-  if (!folder_link::Make(folder.Path(L"a\\loop"), folder.Path())) GTEST_SKIP() << "no links here";
+  const FolderLink loop(folder.Path(L"a\\loop"), folder.Path());
+  if (!loop.Exists()) GTEST_SKIP() << "no links here";
   EXPECT_EQ(Walked(folder.Path()), (Names{L"a", L"a\\file", L"a\\loop"}));
   EXPECT_EQ(Walked(folder.Path(L"a\\loop")), (Names{L"a", L"a\\file", L"a\\loop"})) << "a link as the root is walked";
 }

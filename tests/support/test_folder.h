@@ -1,5 +1,5 @@
 // A folder for the files of one test: empty when the test begins, gone with everything in it when the test ends, also
-// when an assertion fails.
+// when an assertion fails. And the current folder for a while.
 #pragma once
 
 #include <windows.h>
@@ -57,4 +57,19 @@ class TestFolder {
   }
 
   std::wstring m_path;
+};
+
+// Makes `path` the current folder of the process until the end of the scope.
+class CurrentFolder {
+ public:
+  explicit CurrentFolder(const std::wstring& path) : m_before(GetCurrentDirectoryW(0, nullptr), L'\0') {
+    m_before.resize(GetCurrentDirectoryW(static_cast<DWORD>(m_before.size()), m_before.data()));
+    if (!SetCurrentDirectoryW(path.c_str())) throw std::runtime_error("the current folder cannot be changed");
+  }
+  ~CurrentFolder() { SetCurrentDirectoryW(m_before.c_str()); }
+  CurrentFolder(const CurrentFolder&) = delete;
+  CurrentFolder& operator=(const CurrentFolder&) = delete;
+
+ private:
+  std::wstring m_before;
 };
