@@ -23,12 +23,14 @@ Deflater::Deflater() : m_compressor(libdeflate_alloc_compressor(kLevel)) {
 }
 
 bool Deflater::Append(std::span<const uint8_t> input, StreamEnd end, std::vector<uint8_t>& output) {
+  const size_t bound = libdeflate_deflate_compress_bound(m_compressor.get(), input.size());
+  if (m_scratch.size() < bound) m_scratch.resize(bound);
+  const size_t size =
+      libdeflate_deflate_compress(m_compressor.get(), input.data(), input.size(), m_scratch.data(), m_scratch.size());
+  if (size == 0) return false;
   const size_t begin = output.size();
-  output.resize(begin + libdeflate_deflate_compress_bound(m_compressor.get(), input.size()));
-  const size_t size = libdeflate_deflate_compress(m_compressor.get(), input.data(), input.size(), output.data() + begin,
-                                                  output.size() - begin);
-  output.resize(begin + size);
-  if (size != 0 && (end == StreamEnd::kFinal || MakeContinuable(output, begin))) return true;
+  output.insert(output.end(), m_scratch.begin(), m_scratch.begin() + static_cast<std::ptrdiff_t>(size));
+  if (end == StreamEnd::kFinal || MakeContinuable(output, begin)) return true;
   output.resize(begin);
   return false;
 }

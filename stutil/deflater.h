@@ -27,6 +27,7 @@ class Deflater {
     void operator()(libdeflate_compressor* compressor) const;
   };
   std::unique_ptr<libdeflate_compressor, Free> m_compressor;
+  std::vector<uint8_t> m_scratch;  // as big as the worst case needs, so that outputs are as big as they are
 };
 
 // The CRC-32 of zip, and that of `head` followed by `tail`, of which only the CRCs and the length of `tail` are known.

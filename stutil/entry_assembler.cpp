@@ -28,15 +28,13 @@ EntryState EntryAssembler::AddPiece(const PackJob& job, const PackedPart& part, 
 
 bool AddFile(ScopedZipArchive& archive, const FileRecord& file) {
   const std::span<const FileRecord> files(&file, 1);
+  const SourceFile source(file.path);
   EntryAssembler assembler(archive);
-  SourceReader reader;
-  Deflater deflater;
-  JobInput input;
+  PackWorker worker;
   PackedJob packed;
   EntryState state = EntryState::kPending;
   for (const PackJob& job : PlanJobs(files)) {
-    reader.Read(job, files, input);
-    CompressJob(job, input, deflater, packed);
+    worker.Run(job, files, &source, packed);
     state = assembler.Add(job, packed, 0, file);
   }
   return state == EntryState::kAdded;

@@ -3,7 +3,7 @@
 
 #include <span>
 
-#include "stutil/pack_job.h"
+#include "stutil/pack_worker.h"
 #include "stutil/scoped_zip_archive.h"
 
 namespace stutil {

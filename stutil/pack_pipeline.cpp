@@ -1,25 +1,29 @@
 #include "stutil/pack_pipeline.h"
 
 #include <algorithm>
-#include <system_error>
+#include <utility>
 
 namespace stutil {
 namespace {
 
-// More compressors than this only cost memory: one caller writes the archive.
-constexpr size_t kMostCompressors = 8;
-constexpr size_t kJobsAhead = 3;  // read or finished ones, beside one in work on each compressor
+// More workers than this only cost memory: one thread writes the archive.
+constexpr size_t kMostWorkers = 8;
+constexpr size_t kJobsAhead = 3;  // finished ones, beside one in work on each worker
 
-size_t CompressorCount(size_t jobs) {
-  return std::min({size_t{std::max(1U, std::thread::hardware_concurrency())}, kMostCompressors, jobs});
+// One more than there are cores, because a worker that opens a file waits for the system.
+size_t WorkerCount(size_t jobs) {
+  return std::min({size_t{std::thread::hardware_concurrency()} + 1, kMostWorkers, jobs});
 }
 
 }  // namespace
 
 PackPipeline::PackPipeline(std::span<const FileRecord> files, std::span<const PackJob> jobs)
-    : m_files(files), m_jobs(jobs), m_slots(CompressorCount(jobs.size()) + kJobsAhead) {
+    : m_files(files), m_jobs(jobs), m_slots(WorkerCount(jobs.size()) + kJobsAhead) {
+  const size_t workers = WorkerCount(jobs.size());
+  m_threads.reserve(workers);
   try {
-    Start(CompressorCount(jobs.size()));
+    while (m_threads.size() < workers)
+      m_threads.emplace_back(&PackPipeline::Work, this);
   } catch (...) {
     Stop();
     throw;
@@ -30,20 +34,12 @@ PackPipeline::~PackPipeline() {
   Stop();
 }
 
-void PackPipeline::Start(size_t compressors) {
-  m_threads.reserve(1 + compressors);
-  m_threads.emplace_back(&PackPipeline::ReadJobs, this);
-  while (m_threads.size() < 1 + compressors)
-    m_threads.emplace_back(&PackPipeline::CompressJobs, this);
-}
-
 void PackPipeline::Stop() {
   {
     const std::lock_guard lock(m_mutex);
     m_isStopping = true;
   }
-  m_changedForReader.notify_all();
-  m_changedForCompressors.notify_all();
+  m_slotFree.notify_all();
   for (std::thread& thread : m_threads)
     thread.join();
 }
@@ -51,60 +47,44 @@ void PackPipeline::Stop() {
 const PackedJob& PackPipeline::Next() {
   std::unique_lock lock(m_mutex);
   if (m_isHolding) {
-    SlotOf(m_returned).isPacked = false;
+    SlotOf(m_returned).isReady = false;
     ++m_returned;
-    m_changedForReader.notify_one();
+    m_slotFree.notify_one();
   }
   m_isHolding = true;
   const Slot& slot = SlotOf(m_returned);
-  m_changedForCaller.wait(lock, [&] { return slot.isPacked; });
+  m_slotReady.wait(lock, [&] { return slot.isReady; });
   if (slot.failure) std::rethrow_exception(slot.failure);
   return slot.packed;
 }
 
-void PackPipeline::ReadJobs() {
-  SourceReader reader;
-  for (size_t job = 0; job < m_jobs.size(); ++job) {
-    {
-      std::unique_lock lock(m_mutex);
-      m_changedForReader.wait(lock, [&] { return m_isStopping || job < m_returned + m_slots.size(); });
-      if (m_isStopping) return;
-    }
-    Slot& slot = SlotOf(job);
+void PackPipeline::Work() {
+  std::unique_ptr<PackWorker> worker;
+  std::unique_lock lock(m_mutex);
+  for (;;) {
+    m_slotFree.wait(
+        lock, [this] { return m_isStopping || m_claimed == m_jobs.size() || m_claimed < m_returned + m_slots.size(); });
+    if (m_isStopping || m_claimed == m_jobs.size()) return;
+    const PackJob& job = m_jobs[m_claimed];
+    Slot& slot = SlotOf(m_claimed++);
     try {
-      reader.Read(m_jobs[job], m_files, slot.input);
+      const std::shared_ptr<const SourceFile> source = SourceOf(job);
+      lock.unlock();
+      if (!worker) worker = std::make_unique<PackWorker>();
+      worker->Run(job, m_files, source.get(), slot.packed);
     } catch (...) {
       slot.failure = std::current_exception();
     }
-    const std::lock_guard lock(m_mutex);
-    ++m_read;
-    m_changedForCompressors.notify_one();
+    if (!lock.owns_lock()) lock.lock();
+    slot.isReady = true;
+    m_slotReady.notify_one();
   }
 }
 
-void PackPipeline::CompressJobs() {
-  std::unique_ptr<Deflater> deflater;
-  for (;;) {
-    size_t job = 0;
-    {
-      std::unique_lock lock(m_mutex);
-      m_changedForCompressors.wait(lock,
-                                   [this] { return m_isStopping || m_claimed < m_read || m_claimed == m_jobs.size(); });
-      if (m_isStopping || m_claimed == m_jobs.size()) return;
-      job = m_claimed++;
-      if (m_claimed == m_jobs.size()) m_changedForCompressors.notify_all();
-    }
-    Slot& slot = SlotOf(job);
-    try {
-      if (!deflater) deflater = std::make_unique<Deflater>();
-      if (!slot.failure) CompressJob(m_jobs[job], slot.input, *deflater, slot.packed);
-    } catch (...) {
-      slot.failure = std::current_exception();
-    }
-    const std::lock_guard lock(m_mutex);
-    slot.isPacked = true;
-    m_changedForCaller.notify_one();
-  }
+std::shared_ptr<const SourceFile> PackPipeline::SourceOf(const PackJob& job) {
+  if (!job.isPiece) return nullptr;
+  if (job.offset == 0) m_pieceSource = std::make_shared<const SourceFile>(m_files[job.firstFile].path);
+  return job.isLastPiece ? std::exchange(m_pieceSource, nullptr) : m_pieceSource;
 }
 
 }  // namespace stutil

@@ -7,6 +7,7 @@ mixed   400 files, 50 MiB together, as a support collection has them: collectors
 small   10,000 files, 38 MiB together
 big     one log of 50 MiB
 """
+import itertools
 import os
 import random
 import shutil
@@ -18,10 +19,36 @@ FIRST_TIME = 1_700_000_000  # the newest file; each next one is a minute older
 MODULES = [f"{stem}{kind}" for stem in ("kernel", "user", "crypt", "net", "shell", "engine", "scan", "update", "filter",
                                         "comm", "policy", "cache", "event", "proxy", "sync", "quarantine")
            for kind in ("32.dll", "core.dll", "api.dll", "svc.exe", "ui.exe", "drv.sys")]
-WORDS = ("opening closing reading writing scanning waiting started finished failed retry timeout request answer session "
-         "handle buffer socket registry service process thread module signature update version profile user machine "
-         "policy rule cache entry object path folder archive detected clean infected skipped queued resumed").split()
 LEVELS = ("INFO ", "INFO ", "INFO ", "TRACE", "TRACE", "WARN ", "ERROR")
+
+
+class Language:
+    """Words of made-up syllables and messages made of them, used as such things are: the n-th most common one n times
+    less often than the first."""
+
+    def __init__(self, rng):
+        syllables = [c + v + e for c in "bcdfghklmnprstvz" for v in "aeiou" for e in ("", "n", "r", "s", "t", "l")]
+        self.words = ["".join(rng.choices(syllables, k=rng.choice((1, 2, 2, 3, 3, 4)))) for _ in range(8000)]
+        self.word_weights = self.falling_weights(len(self.words))
+        self.messages = [self.sentence(rng, 3, 14) for _ in range(3000)]
+        self.message_weights = self.falling_weights(len(self.messages))
+
+    @staticmethod
+    def falling_weights(count):
+        return list(itertools.accumulate(1 / (rank + 2.7) for rank in range(count)))
+
+    def sentence(self, rng, low, high):
+        return " ".join(rng.choices(self.words, cum_weights=self.word_weights, k=rng.randrange(low, high)))
+
+    def message(self, rng):
+        return rng.choices(self.messages, cum_weights=self.message_weights)[0]
+
+
+LANGUAGE = Language(random.Random(0))
+
+
+def path(rng):
+    return f"C:\\Program Files\\Vendor\\{LANGUAGE.sentence(rng, 1, 3)}\\{rng.choice(MODULES)}"
 
 
 def log_text(rng, size):
@@ -29,10 +56,11 @@ def log_text(rng, size):
     while length < size:
         clock += int(rng.expovariate(1 / 40))
         seconds, millis = divmod(clock, 1000)
-        words = " ".join(rng.choices(WORDS, k=rng.randrange(3, 9)))
         line = (f"2023-11-14 {seconds // 3600 % 24:02}:{seconds // 60 % 60:02}:{seconds % 60:02}.{millis:03} "
-                f"[{rng.randrange(2000, 2400)}] {rng.choice(LEVELS)} {rng.choice(MODULES)}: {words} "
-                f"0x{rng.getrandbits(32):08x} C:\\Program Files\\Vendor\\{rng.choice(MODULES)}\r\n")
+                f"[{rng.randrange(2000, 2400)}] {rng.choice(LEVELS)} {rng.choice(MODULES)}: "
+                f"{LANGUAGE.message(rng)}\r\n")
+        if rng.random() < 0.2:
+            line = line[:-2] + f" [{path(rng)}] 0x{rng.getrandbits(32):08x}\r\n"
         parts.append(line)
         length += len(line)
     return "".join(parts).encode()[:size]
@@ -42,11 +70,14 @@ def json_text(rng, size):
     parts, length = ["{\n   \"items\" : [\n"], 0
     while length < size:
         name = rng.choice(MODULES)
-        item = (f"      {{\n         \"company\" : \"Vendor Corporation\",\n         \"handles\" : {rng.randrange(2000)},\n"
+        item = (f"      {{\n         \"company\" : \"Vendor Corporation\",\n"
+                f"         \"description\" : \"{LANGUAGE.message(rng)}\",\n"
+                f"         \"handles\" : {rng.randrange(2000)},\n"
                 f"         \"md5\" : \"{rng.getrandbits(128):032x}\",\n         \"name\" : \"{name}\",\n"
-                f"         \"path\" : \"C:\\\\Windows\\\\System32\\\\{name}\",\n         \"pid\" : {rng.randrange(4, 30000, 4)},\n"
-                f"         \"signed\" : {rng.choice(('true', 'false'))},\n         \"size\" : {rng.randrange(4_000_000)},\n"
-                f"         \"state\" : \"{rng.choice(WORDS)} {rng.choice(WORDS)}\"\n      }},\n")
+                f"         \"path\" : \"C:\\\\Windows\\\\System32\\\\{name}\",\n"
+                f"         \"pid\" : {rng.randrange(4, 30000, 4)},\n"
+                f"         \"signed\" : {rng.choice(('true', 'false'))},\n         \"size\" : {rng.randrange(4_000_000)}\n"
+                f"      }},\n")
         parts.append(item)
         length += len(item)
     return "".join(parts).encode()[:size]

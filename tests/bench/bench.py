@@ -1,0 +1,193 @@
+#!/usr/bin/env python3
+"""Measures the program against native peers: same files, same run, rounds in turn, medians.
+
+usage: bench.py [--list] [--rounds N] [--programs FOLDER] [ROW...]
+
+Ours runs under Wine, the peer natively; both are whole processes on the wall clock. The ratio is the median of the
+rounds' own ratios; below 1 ours is faster (or smaller). Speed is reported, never asserted: the exit status is 1 only when
+something failed to run or made a wrong result.
+
+A row is a function that takes a Bench and yields Lines, and one line in ROWS.
+"""
+import argparse
+import difflib
+import os
+import statistics
+import subprocess
+import sys
+import time
+from typing import NamedTuple
+
+import make_corpus
+
+ROOT = os.path.dirname(os.path.dirname(os.path.dirname(os.path.abspath(__file__))))
+FOLDER = f"{ROOT}/build/bench"
+SESSION = f"{ROOT}/tools/wine_session.sh"
+MIB = 1 << 20
+
+
+class Line(NamedTuple):
+    name: str
+    ours: str
+    peer: str
+    ratio: float | None  # None where the goal is about `value`
+    goal: float
+    value: float | None = None  # what the goal bounds, when that is not the ratio
+
+    def print(self):
+        value = self.ratio if self.value is None else self.value
+        ratio = "-" if self.ratio is None else f"{self.ratio:.2f}"
+        verdict = "reached" if value <= self.goal else "MISSED"
+        print(f"{self.name:24} {self.ours:>11} {self.peer:>11} {ratio:>6} {self.goal:>6g}  {verdict}", flush=True)
+
+
+class Bench:
+    def __init__(self, programs, rounds):
+        self.programs = programs
+        self.rounds = rounds
+        self.wine = wine_environment()
+        self._corpora = None
+
+    def corpus(self, name):
+        if self._corpora is None:
+            self._corpora = make_corpus.make_corpus(FOLDER)
+        return self._corpora[name]
+
+    def ours(self, program, *arguments):
+        """The command line of a program of the build; to be run with `wine=True`."""
+        path = f"{self.programs}/{program}.exe"
+        if not os.path.exists(path):
+            raise RuntimeError(f"{path} is not built")
+        return ["wine", path, *arguments]
+
+    def run(self, command, wine=False):
+        """Seconds on the wall clock, and the peak resident size in bytes, of one run."""
+        begin = time.perf_counter()
+        process = subprocess.Popen(command, cwd=FOLDER, env=self.wine if wine else None, stdin=subprocess.DEVNULL,
+                                   stdout=subprocess.DEVNULL)
+        _, status, usage = os.wait4(process.pid, 0)
+        seconds = time.perf_counter() - begin
+        process.returncode = os.waitstatus_to_exitcode(status)
+        if process.returncode != 0:
+            raise RuntimeError(f"{' '.join(command)}: exit status {process.returncode}")
+        return seconds, usage.ru_maxrss * 1024
+
+    def compare(self, name, goal, ours, peer, before=lambda: None, after=lambda: None):
+        """A line about the time of two commands. `before` and `after` are called around each run, outside the clock."""
+        def timed(command, wine):
+            before()
+            seconds, _ = self.run(command, wine)
+            after()
+            return seconds
+
+        timed(ours, True), timed(peer, False)  # warm up: files into the cache, services of the session
+        pairs = []
+        for index in range(self.rounds):
+            runs = [(ours, True), (peer, False)]
+            if index % 2:
+                runs.reverse()
+            seconds = {wine: timed(command, wine) for command, wine in runs}
+            pairs.append((seconds[True], seconds[False]))
+        ours_time, peer_time = (statistics.median(side) for side in zip(*pairs))
+        ratio = statistics.median(one / other for one, other in pairs)
+        return Line(name, f"{ours_time:.3f} s", f"{peer_time:.3f} s", ratio, goal)
+
+    def peak_over_idle(self, name, goal_mib, command, idle):
+        """A line about the memory of one of our commands over that of another one. (A child's peak starts at what this
+        process has resident, which therefore has to stay below the idle program's: large data is left to children.)"""
+        peaks = [(self.run(command, True)[1], self.run(idle, True)[1]) for _ in range(3)]
+        over = max(peak for peak, _ in peaks) - min(peak for _, peak in peaks)
+        return Line(name, f"{over / MIB:.1f} MiB", "-", None, goal_mib, over / MIB)
+
+
+def wine_environment():
+    up = subprocess.run(["bash", "-c", f"source {SESSION} && st_wine_up && env -0"], check=True, text=True,
+                        stdin=subprocess.DEVNULL, stdout=subprocess.PIPE)
+    return dict(item.split("=", 1) for item in up.stdout.split("\0") if "=" in item)
+
+
+def remove(path):
+    if os.path.exists(path):
+        os.remove(path)
+
+
+# --- rows
+
+def pack(corpus, time_goal, size_goal):
+    def row(bench):
+        folder, ours, peer = bench.corpus(corpus), f"{FOLDER}/ours.zip", f"{FOLDER}/peer.zip"
+
+        def clear():
+            remove(ours), remove(peer)
+
+        def check():
+            if os.path.exists(ours):
+                subprocess.run([sys.executable, f"{ROOT}/tests/bench/verify_archive.py", ours, folder], check=True)
+                sizes["ours"] = os.path.getsize(ours)
+            else:
+                sizes["peer"] = os.path.getsize(peer)
+
+        sizes = {}
+        yield bench.compare(f"pack-{corpus}", time_goal, bench.ours("pack_bench", ours, corpus),
+                            ["zip", "-6", "-r", "-q", peer, corpus], clear, check)
+        clear()
+        yield Line("  archive size", f"{sizes['ours']} B", f"{sizes['peer']} B", sizes["ours"] / sizes["peer"], size_goal)
+    return row
+
+
+def pack_memory(bench):
+    archive = f"{FOLDER}/ours.zip"
+    idle = bench.ours("pack_bench", archive)
+    for corpus, goal in (("mixed", 24), ("small", 24), ("big", 40)):
+        bench.corpus(corpus)
+        yield bench.peak_over_idle(f"pack-memory {corpus}", goal, bench.ours("pack_bench", archive, corpus), idle)
+    remove(archive)
+
+
+ROWS = {
+    "pack-mixed": ("50 MiB in 400 mixed files, against zip -6", pack("mixed", 0.60, 1.02)),
+    "pack-small": ("38 MiB in 10,000 files, against zip -6", pack("small", 0.90, 1.02)),
+    "pack-big": ("one file of 50 MiB, against zip -6", pack("big", 0.75, 1.01)),
+    "pack-memory": ("peak memory of packing over an idle run", pack_memory),
+}
+
+
+def run_rows(bench, names):
+    print(f"{'row':24} {'ours':>11} {'peer':>11} {'ratio':>6} {'goal':>6}  verdict")
+    failed = False
+    for name in names:
+        try:
+            for line in ROWS[name][1](bench):
+                line.print()
+        except (OSError, RuntimeError, subprocess.SubprocessError) as error:
+            print(f"{name:24} FAILED: {error}", flush=True)
+            failed = True
+    return failed
+
+
+def main():
+    parser = argparse.ArgumentParser(description=__doc__, formatter_class=argparse.RawDescriptionHelpFormatter)
+    parser.add_argument("rows", nargs="*", metavar="ROW")
+    parser.add_argument("--list", action="store_true", help="name the rows")
+    parser.add_argument("--rounds", type=int, default=7)
+    parser.add_argument("--programs", default=f"{ROOT}/build/windows-cross/bin", help="where the programs of the build are")
+    options = parser.parse_args()
+    if options.list:
+        for name, (meaning, _) in ROWS.items():
+            print(f"{name:14} {meaning}")
+        return 0
+    for name in options.rows:
+        if name not in ROWS:
+            nearest = difflib.get_close_matches(name, ROWS, 1, 0)[0]
+            parser.error(f"there is no row {name}; is {nearest} meant?")
+    os.makedirs(FOLDER, exist_ok=True)
+    was_up = subprocess.run(["bash", "-c", f"source {SESSION} && wineserver -k0"], stderr=subprocess.DEVNULL).returncode == 0
+    try:
+        return int(run_rows(Bench(os.path.abspath(options.programs), max(1, options.rounds)), options.rows or ROWS))
+    finally:
+        if not was_up:
+            subprocess.run([SESSION, "down"], check=False)
+
+
+if __name__ == "__main__":
+    sys.exit(main())
