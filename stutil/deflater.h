@@ -1,4 +1,6 @@
-// Deflate compression for the archive: fast, whole buffers, one object a thread.
+// Deflate compression for the archive: whole buffers, one object a thread. Whole files go through the fast compressor,
+// which makes complete streams only; the pieces of a big file go through the zip library's own, which can end one at a
+// byte boundary so that the next may follow.
 #pragma once
 
 #include <cstdint>
@@ -18,15 +20,21 @@ enum class StreamEnd {
 class Deflater {
  public:
   Deflater();  // throws std::bad_alloc
+  ~Deflater();
 
   // Appends the compressed form of `input` to `output`. False when compression failed; `output` is as before then.
   bool Append(std::span<const uint8_t> input, StreamEnd end, std::vector<uint8_t>& output);
 
  private:
+  size_t CompressWhole(std::span<const uint8_t> input);  // into m_scratch; 0 on failure
+  size_t CompressPiece(std::span<const uint8_t> input);
+
   struct Free {
     void operator()(libdeflate_compressor* compressor) const;
   };
-  std::unique_ptr<libdeflate_compressor, Free> m_compressor;
+  std::unique_ptr<libdeflate_compressor, Free> m_whole;
+  struct PieceCompressor;
+  std::unique_ptr<PieceCompressor> m_pieces;  // made with the first piece
   std::vector<uint8_t> m_scratch;  // as big as the worst case needs, so that outputs are as big as they are
 };
 

@@ -6,8 +6,7 @@
 #include <memory>
 #include <random>
 #include <string>
-
-#include "stutil/deflate_join.h"
+#include <vector>
 
 namespace stutil {
 namespace {
@@ -81,34 +80,6 @@ TEST(Deflater, JoinsStreamsThatEndAtAnyBit) {
     ASSERT_TRUE(deflater.Append({}, StreamEnd::kFinal, stream));
     EXPECT_TRUE(InflatesTo(stream, input)) << length;
   }
-}
-
-TEST(FindFinalBlock, RefusesWhatIsNoWholeStream) {
-  Bytes stream;
-  ASSERT_TRUE(Deflater().Append(Mixture(), StreamEnd::kFinal, stream));
-  ASSERT_TRUE(FindFinalBlock(stream));
-  for (size_t size = 0; size < stream.size(); size += 997) {
-    EXPECT_FALSE(FindFinalBlock(std::span<const uint8_t>(stream).first(size))) << size;
-  }
-  const Bytes reserved = {0x07, 0x00};                       // block type 3
-  const Bytes stored = {0x01, 0x01, 0x00, 0xFF, 0xFF, 'a'};  // length and complement disagree
-  const Bytes oversubscribed = {0x05, 0x00, 0x92, 0x24, 0x49, 0x92, 0x24, 0x49, 0x92};
-  for (const Bytes& bytes : {Bytes(), reserved, stored, oversubscribed})
-    EXPECT_FALSE(FindFinalBlock(bytes));
-
-  std::mt19937 random(9);
-  for (int i = 0; i < 20'000; ++i) {
-    Bytes damaged(stream.begin(), stream.begin() + 300);
-    for (int flips = 0; flips < 4; ++flips)
-      damaged[random() % damaged.size()] ^= static_cast<uint8_t>(random());
-    FindFinalBlock(damaged);  // ends, inside its bounds
-  }
-}
-
-TEST(MakeContinuable, LeavesADamagedStreamAlone) {
-  Bytes bytes = {0xAA, 0x07, 0x00};
-  EXPECT_FALSE(MakeContinuable(bytes, 1));
-  EXPECT_EQ(bytes, (Bytes{0xAA, 0x07, 0x00}));
 }
 
 }  // namespace
