@@ -73,7 +73,7 @@ TEST_F(SettingsFile, ChangesAreAppliedWhileTheProgramRuns) {
   Save("<configuration path='elsewhere'><level>INFO</lev");
   EXPECT_TRUE(Becomes([this] { return !Log(L"elsewhere").empty(); }));
   m_folder.MakeFile(L"another file of the folder");  // wakes the watcher without a change of the settings
-  Sleep(1000);  // longer than the watcher's patience with a broken file
+  Sleep(1000);                                       // longer than the watcher's patience with a broken file
   EXPECT_EQ(m_log.LogGetLevel(), 12u);
   EXPECT_THAT(Lines(Log(L"elsewhere")),
               ElementsAre(AllOf(HasSubstr(" WARNING "), HasSubstr("Logger.xml cannot be used"))));
