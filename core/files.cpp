@@ -111,8 +111,10 @@ bool FolderExists(std::wstring_view path) {
 }
 
 DWORD ReadWholeFile(std::wstring_view path, uint64_t limit, std::string& bytes) {
-  const KernelHandle file(CreateFileW(ExtendedPath(path).c_str(), GENERIC_READ, FILE_SHARE_READ | FILE_SHARE_WRITE,
-                                      nullptr, OPEN_EXISTING, FILE_FLAG_SEQUENTIAL_SCAN, nullptr));
+  // All sharing: neither who writes a log nor who replaces a settings file by renaming is to be disturbed.
+  constexpr DWORD kShareAll = FILE_SHARE_READ | FILE_SHARE_WRITE | FILE_SHARE_DELETE;
+  const KernelHandle file(CreateFileW(ExtendedPath(path).c_str(), GENERIC_READ, kShareAll, nullptr, OPEN_EXISTING,
+                                      FILE_FLAG_SEQUENTIAL_SCAN, nullptr));
   if (!file) return GetLastError();
   LARGE_INTEGER size{};
   if (!GetFileSizeEx(file.Get(), &size)) return GetLastError();

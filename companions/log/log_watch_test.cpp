@@ -1,5 +1,6 @@
 #include <gmock/gmock.h>
 
+#include "companions/log/log_settings.h"
 #include "companions/log/log_test_library.h"
 #include "tests/support/log_text.h"
 #include "tests/support/test_folder.h"
@@ -72,7 +73,7 @@ TEST_F(SettingsFile, ChangesAreAppliedWhileTheProgramRuns) {
   Save("<configuration path='elsewhere'><level>INFO</lev");
   EXPECT_TRUE(Becomes([this] { return !Log(L"elsewhere").empty(); }));
   m_folder.MakeFile(L"another file of the folder");  // wakes the watcher without a change of the settings
-  Sleep(400);
+  Sleep(1000);                                       // longer than the watcher's patience with a broken file
   EXPECT_EQ(m_log.LogGetLevel(), 12u);
   EXPECT_THAT(Lines(Log(L"elsewhere")),
               ElementsAre(AllOf(HasSubstr(" WARNING "), HasSubstr("Logger.xml cannot be used"))));
@@ -97,6 +98,12 @@ TEST_F(SettingsFile, AReplacedFileAndANewlyNamedOneAreNoticed) {
   m_log.LogSetSettingsFile(other.c_str());
   m_folder.MakeFile(L"later\\Logger.xml", "<configuration path='logs'><level>INFO</level></configuration>");
   EXPECT_TRUE(Becomes([this] { return m_log.LogGetLevel() == 16; }));
+}
+
+TEST(ShippedSettings, SayWhatTheDefaultsAre) {
+  const logfile::ParsedSettings parsed = logfile::ParseSettings(LogText(ProgramFolder() + L"\\Logger.xml"));
+  EXPECT_THAT(parsed.problems, testing::IsEmpty());
+  EXPECT_EQ(parsed.settings, logfile::Settings());
 }
 
 // A library that watches is asked to go without LogDeinit: the watching thread keeps the code it runs in.
