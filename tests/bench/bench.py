@@ -64,22 +64,22 @@ class Bench:
         return ["wine", path, *arguments]
 
     def run(self, command, wine=False):
-        """Seconds on the wall clock, and the peak resident size in bytes, of one run."""
+        """Seconds on the wall clock of one run."""
         begin = time.perf_counter()
-        process = subprocess.Popen(command, cwd=FOLDER, env=self.wine if wine else None, stdin=subprocess.DEVNULL,
-                                   stdout=subprocess.DEVNULL)
-        _, status, usage = os.wait4(process.pid, 0)
-        seconds = time.perf_counter() - begin
-        process.returncode = os.waitstatus_to_exitcode(status)
-        if process.returncode != 0:
-            raise RuntimeError(f"{' '.join(command)}: exit status {process.returncode}")
-        return seconds, usage.ru_maxrss * 1024
+        subprocess.run(command, cwd=FOLDER, env=self.wine if wine else None, stdin=subprocess.DEVNULL,
+                       stdout=subprocess.DEVNULL, check=True)
+        return time.perf_counter() - begin
+
+    def output(self, command):
+        """What one of our programs prints."""
+        return subprocess.run(command, cwd=FOLDER, env=self.wine, stdin=subprocess.DEVNULL, check=True, text=True,
+                              stdout=subprocess.PIPE).stdout
 
     def compare(self, name, goal, ours, peer, before=lambda: None, after=lambda: None, peer_in_wine=False):
         """A line about the time of two commands. `before` and `after` are called around each run, outside the clock."""
         def timed(side):
             before()
-            seconds, _ = self.run(*side)
+            seconds = self.run(*side)
             after()
             return seconds
 
@@ -97,11 +97,14 @@ class Bench:
         ratio = statistics.median(one / other for one, other in pairs)
         return Line(name, f"{ours_time:.3f} s", f"{peer_time:.3f} s", ratio, goal)
 
-    def peak_over_idle(self, name, goal_mib, command, idle):
-        """A line about the memory of one of our commands over that of another one. (A child's peak starts at what this
-        process has resident, which therefore has to stay below the idle program's: large data is left to children.)"""
-        peaks = [(self.run(command, True)[1], self.run(idle, True)[1]) for _ in range(3)]
-        over = max(peak for peak, _ in peaks) - min(peak for _, peak in peaks)
+    def peak_over_idle(self, name, goal_mib, command, idle, before=lambda: None):
+        """A line about the memory of one of our commands over that of another one; both print their own peak."""
+        def peak(side):
+            before()
+            return int(re.search(r"peak_memory=(\d+)", self.output(side)).group(1))
+
+        rounds = [(peak(command), peak(idle)) for _ in range(3)]
+        over = max(one for one, _ in rounds) - min(other for _, other in rounds)
         return Line(name, f"{over / MIB:.1f} MiB", "-", None, goal_mib, over / MIB)
 
 
@@ -166,18 +169,15 @@ def encrypt(bench):
     openssl = ["openssl", "enc", "-rc4", "-provider", "legacy", "-provider", "default", "-K", "0123456789" + 22 * "0",
                "-in", archive, "-out", peer]
     yield bench.compare("encrypt", 1.15, bench.ours("encrypt_bench", ours), openssl, before, after)
-    before()
-    yield bench.peak_over_idle("encrypt-memory", 2.2 * size / MIB, bench.ours("encrypt_bench", ours),
-                               bench.ours("pack_bench", f"{FOLDER}/ours.zip"))
+    yield bench.peak_over_idle("  peak memory", 2.2 * size / MIB, bench.ours("encrypt_bench", ours),
+                               bench.ours("pack_bench", f"{FOLDER}/ours.zip"), before)
     for path in (ours, peer, f"{FOLDER}/ours.zip"):
         remove(path)
 
 
 def walk(bench):
     command = bench.ours("walk_bench", bench.corpus("small"))
-    result = subprocess.run(command, cwd=FOLDER, env=bench.wine, stdin=subprocess.DEVNULL, check=True, text=True,
-                            capture_output=True).stdout
-    figures = dict(re.findall(r"(walk_dir ms|bare ms|ratio)=([0-9.]+)", result))
+    figures = dict(re.findall(r"(walk_dir ms|bare ms|ratio)=([0-9.]+)", bench.output(command)))
     yield Line("walk", f"{figures['walk_dir ms']} ms", f"{figures['bare ms']} ms", float(figures["ratio"]), 1.5)
 
 

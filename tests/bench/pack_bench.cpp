@@ -5,6 +5,7 @@
 #include <vector>
 
 #include "stutil/zip.h"
+#include "tests/bench/peak_memory.h"
 
 int wmain(int count, wchar_t** arguments) {
   if (count < 2) {
@@ -12,5 +13,7 @@ int wmain(int count, wchar_t** arguments) {
     return 2;
   }
   const std::vector<std::wstring> folders(arguments + 2, arguments + count);
-  return stutil::CompressWithSizeLimit_MostRecentFirst(folders, arguments[1]) ? 0 : 1;
+  const bool isPacked = stutil::CompressWithSizeLimit_MostRecentFirst(folders, arguments[1]);
+  PrintPeakMemory();
+  return isPacked ? 0 : 1;
 }
