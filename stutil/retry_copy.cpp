@@ -3,6 +3,7 @@
 #include <windows.h>
 
 #include <algorithm>
+#include <string>
 #include <thread>
 
 #include "core/files.h"
@@ -16,7 +17,7 @@ using std::chrono::milliseconds;
 constexpr milliseconds kPatienceForOneFile{250};
 constexpr milliseconds kPause{25};
 
-// Deletes the copy, also when it could be written in part only.
+// Deletes a copy that was made.
 class ScopedCopy {
  public:
   explicit ScopedCopy(const std::wstring& path) : m_path(path) {}

@@ -2,6 +2,7 @@
 #pragma once
 
 #include <chrono>
+#include <string>
 
 #include "stutil/scoped_zip_archive.h"
 #include "stutil/zip_selection.h"

@@ -13,7 +13,7 @@ namespace {
 
 constexpr uint64_t kLocalHeaderSize = 30;
 
-// The days 1980-01-02 and 2107-12-30 in UTC: whatever the time zone, the local time has a place in a zip entry.
+// The days 1980-01-02 and 2107-12-31 in UTC: whatever the time zone, the local time has a place in a zip entry.
 constexpr uint64_t kEarliestTime = 315'619'200;
 constexpr uint64_t kLatestTime = 4'354'732'800;
 

@@ -1,8 +1,8 @@
 #include "stutil/zip.h"
 
-#include <algorithm>
-#include <chrono>
 #include <exception>
+#include <new>
+#include <system_error>
 
 #include "core/files.h"
 #include "core/logging.h"
@@ -20,7 +20,7 @@ namespace {
 
 constexpr wchar_t kFunction[] = L"stutil::CompressWithSizeLimit_MostRecentFirst";
 
-constexpr uint64_t Join(DWORD high, DWORD low) {
+constexpr uint64_t Combine(DWORD high, DWORD low) {
   return uint64_t{high} << 32 | low;
 }
 
@@ -32,8 +32,9 @@ void CollectRecords(std::wstring_view folder, std::wstring_view archivePath, std
     const std::wstring_view source(path.c_str(), path.size());
     if (source.ends_with(kPartialSuffix) && ExtendedPath(source) == archivePath) return kWalkContinue;
     files.push_back(
-        {std::wstring(source), MakeEntryName(rootName, folder, source), Join(entry.nFileSizeHigh, entry.nFileSizeLow),
-         UnixTimeFromFileTime(Join(entry.ftLastWriteTime.dwHighDateTime, entry.ftLastWriteTime.dwLowDateTime))});
+        {std::wstring(source), MakeEntryName(rootName, folder, source),
+         Combine(entry.nFileSizeHigh, entry.nFileSizeLow),
+         UnixTimeFromFileTime(Combine(entry.ftLastWriteTime.dwHighDateTime, entry.ftLastWriteTime.dwLowDateTime))});
     return kWalkContinue;
   });
 }
@@ -82,6 +83,12 @@ void Pack(ScopedZipArchive& archive, const std::vector<FileRecord>& files) {
   }
 }
 
+// Memory or threads ran out; the archive holds what was packed before.
+bool EndedEarly(const std::exception& error) {
+  LOG_ERROR(kFunction, L"compression ended early: %s", ToWide(error.what()).c_str());
+  return false;
+}
+
 }  // namespace
 
 bool CompressWithSizeLimit_MostRecentFirst(const std::vector<std::wstring>& folders, const std::wstring& archivePath) {
@@ -91,9 +98,10 @@ bool CompressWithSizeLimit_MostRecentFirst(const std::vector<std::wstring>& fold
     const std::vector<FileRecord> files = SelectFiles(folders, archive.PartialPath());
     if (!files.empty()) Pack(archive, files);
     return true;
-  } catch (const std::exception& error) {
-    LOG_ERROR(kFunction, L"compression ended early: %s", ToWide(error.what()).c_str());
-    return false;
+  } catch (const std::bad_alloc& error) {
+    return EndedEarly(error);
+  } catch (const std::system_error& error) {  // no thread could be started
+    return EndedEarly(error);
   }
 }
 

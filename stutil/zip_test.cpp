@@ -3,7 +3,7 @@
 #include <gmock/gmock.h>
 #include <miniz.h>
 
-#include <atomic>
+#include <algorithm>
 #include <thread>
 
 #include "core/logging.h"
@@ -17,11 +17,9 @@ namespace stutil {
 namespace {
 
 using testing::ElementsAre;
-using testing::HasSubstr;
 using testing::IsEmpty;
 using testing::Pair;
 using testing::SizeIs;
-using testing::UnorderedElementsAre;
 
 using Entries = std::vector<std::pair<std::wstring, std::string>>;  // name and content, in the archive's order
 
