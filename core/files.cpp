@@ -203,7 +203,7 @@ DWORD CreateFolders(std::wstring_view path) {
 }
 
 std::wstring ExpandEnvironment(std::wstring_view text) {
-  const std::wstring source(text);
+  std::wstring source(text);
   const DWORD size = ExpandEnvironmentStringsW(source.c_str(), nullptr, 0);
   std::wstring expanded(size, L'\0');
   const DWORD written = ExpandEnvironmentStringsW(source.c_str(), expanded.data(), size);

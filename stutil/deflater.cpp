@@ -50,8 +50,7 @@ size_t Deflater::CompressPiece(std::span<const uint8_t> input) {
   if (m_scratch.size() < bound) m_scratch.resize(bound);
   size_t read = input.size();
   size_t written = m_scratch.size();
-  const tdefl_status status =
-      tdefl_compress(&state, input.data(), &read, m_scratch.data(), &written, TDEFL_SYNC_FLUSH);
+  const tdefl_status status = tdefl_compress(&state, input.data(), &read, m_scratch.data(), &written, TDEFL_SYNC_FLUSH);
   return status == TDEFL_STATUS_OKAY && read == input.size() && written < m_scratch.size() ? written : 0;
 }
 

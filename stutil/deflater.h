@@ -35,7 +35,7 @@ class Deflater {
   std::unique_ptr<libdeflate_compressor, Free> m_whole;
   struct PieceCompressor;
   std::unique_ptr<PieceCompressor> m_pieces;  // made with the first piece
-  std::vector<uint8_t> m_scratch;  // as big as the worst case needs, so that outputs are as big as they are
+  std::vector<uint8_t> m_scratch;             // as big as the worst case needs, so that outputs are as big as they are
 };
 
 // The CRC-32 of zip, and that of `head` followed by `tail`, of which only the CRCs and the length of `tail` are known.
