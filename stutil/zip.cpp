@@ -1,5 +1,6 @@
 #include "stutil/zip.h"
 
+#include <ctime>
 #include <exception>
 #include <new>
 #include <system_error>
@@ -39,15 +40,22 @@ void CollectRecords(std::wstring_view folder, std::wstring_view archivePath, std
   });
 }
 
-// The files to compress, newest first.
-std::vector<FileRecord> SelectFiles(const std::vector<std::wstring>& folders, const std::wstring& archivePath) {
+struct Contents {
+  std::vector<FileRecord> files;           // to compress, newest first
+  std::vector<std::wstring> emptyFolders;  // entry names of the source folders without files: they show all the same
+};
+
+Contents SelectContents(const std::vector<std::wstring>& folders, const std::wstring& archivePath) {
   std::vector<FileRecord> files;
+  std::vector<std::wstring> emptyFolders;
   for (const std::wstring& folder : folders) {
-    if (FolderExists(folder)) {
-      CollectRecords(folder, archivePath, files);
-    } else {
+    if (!FolderExists(folder)) {
       LOG_ERROR(kFunction, L"compression source does not exist");
+      continue;
     }
+    const size_t before = files.size();
+    CollectRecords(folder, archivePath, files);
+    if (files.size() == before) emptyFolders.push_back(std::wstring(LastPathComponent(folder)) + L"/");
   }
   Selection selection = SelectWithinLimit(std::move(files), kArchiveSizeLimit);
   for (const FileRecord& file : selection.skipped) {
@@ -56,7 +64,14 @@ std::vector<FileRecord> SelectFiles(const std::vector<std::wstring>& folders, co
   }
   LOG_INFO(kFunction, L"[files to compress %d] [archive size %llu]", static_cast<int>(selection.selected.size()),
            selection.totalSize);
-  return std::move(selection.selected);
+  return {std::move(selection.selected), std::move(emptyFolders)};
+}
+
+void AddEmptyFolders(ScopedZipArchive& archive, const std::vector<std::wstring>& names) {
+  const auto now = static_cast<uint64_t>(std::time(nullptr));
+  for (const std::wstring& name : names) {
+    if (!archive.Add({name, now}, {})) LOG_ERROR(kFunction, L"cannot add folder %s", name.c_str());
+  }
 }
 
 void Pack(ScopedZipArchive& archive, const std::vector<FileRecord>& files) {
@@ -95,8 +110,9 @@ bool CompressWithSizeLimit_MostRecentFirst(const std::vector<std::wstring>& fold
   try {
     ScopedZipArchive archive(archivePath);
     if (!archive.IsOpen()) return false;
-    const std::vector<FileRecord> files = SelectFiles(folders, archive.PartialPath());
-    if (!files.empty()) Pack(archive, files);
+    const Contents contents = SelectContents(folders, archive.PartialPath());
+    AddEmptyFolders(archive, contents.emptyFolders);
+    if (!contents.files.empty()) Pack(archive, contents.files);
     return true;
   } catch (const std::bad_alloc& error) {
     return EndedEarly(error);

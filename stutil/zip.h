@@ -10,9 +10,10 @@
 namespace stutil {
 
 // True when the archive could be created and the pass over the files ran, whatever became of single files; failures are
-// logged. A file that grows meanwhile is cut at the size it was found with; one that shrinks is packed as it is. An
-// archive that is there already is replaced. Under `archivePath` stands a whole archive or nothing: when the disk is
-// full, say, there is none although the result is true. Uses all cores; blocks until it is done.
+// logged. A folder without files is an entry of its own. A file that grows meanwhile is cut at the size it was found
+// with; one that shrinks is packed as it is. An archive that is there already is replaced. Under `archivePath` stands a
+// whole archive or nothing: when the disk is full, say, there is none although the result is true. Uses all cores;
+// blocks until it is done.
 bool CompressWithSizeLimit_MostRecentFirst(const std::vector<std::wstring>& folders, const std::wstring& archivePath);
 
 }  // namespace stutil

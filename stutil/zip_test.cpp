@@ -157,6 +157,14 @@ TEST(CompressWithSizeLimit, NothingToPackGivesAnEmptyArchive) {
                                          L"compression source does not exist"));
 }
 
+TEST(CompressWithSizeLimit, AFolderWithoutFilesShowsAsAFolder) {
+  const TestFolder test;
+  const std::wstring archive = test.Path(L"a.zip");
+  test.MakeFile(L"logs\\x.txt", "x");
+  ASSERT_TRUE(CompressWithSizeLimit_MostRecentFirst({test.MakeFolder(L"install_logs"), test.Path(L"logs")}, archive));
+  EXPECT_THAT(ReadArchive(archive), ElementsAre(Pair(L"install_logs/", ""), Pair(L"logs/x.txt", "x")));
+}
+
 TEST(CompressWithSizeLimit, DoesNotPackTheArchiveItself) {
   const TestFolder test;
   test.MakeFile(L"f\\x.txt", "x");

@@ -5,7 +5,7 @@
 #include <vector>
 
 #include "stutil/zip.h"
-#include "tests/bench/peak_memory.h"
+#include "tests/bench/measure.h"
 
 int wmain(int count, wchar_t** arguments) {
   if (count < 2) {
@@ -13,7 +13,5 @@ int wmain(int count, wchar_t** arguments) {
     return 2;
   }
   const std::vector<std::wstring> folders(arguments + 2, arguments + count);
-  const bool isPacked = stutil::CompressWithSizeLimit_MostRecentFirst(folders, arguments[1]);
-  PrintPeakMemory();
-  return isPacked ? 0 : 1;
+  return Measure([&] { return stutil::CompressWithSizeLimit_MostRecentFirst(folders, arguments[1]); }) ? 0 : 1;
 }
