@@ -164,3 +164,25 @@ DWORD CreatePrivateFolder(std::wstring_view path) {
   SECURITY_ATTRIBUTES attributes{sizeof attributes, descriptor.Get(), FALSE};
   return CreateDirectoryW(ExtendedPath(path).c_str(), &attributes) ? ERROR_SUCCESS : GetLastError();
 }
+
+DWORD CreateFolders(std::wstring_view path) {
+  const std::wstring full = ExtendedPath(path);
+  if (FolderExists(full) || CreateDirectoryW(full.c_str(), nullptr)) return ERROR_SUCCESS;
+  DWORD error = GetLastError();
+  const size_t separator = full.find_last_of(L'\\');
+  if (error == ERROR_PATH_NOT_FOUND && separator != std::wstring::npos && separator > kLocalPrefix.size()) {
+    error = CreateFolders(full.substr(0, separator));
+    if (error == ERROR_SUCCESS && !CreateDirectoryW(full.c_str(), nullptr)) error = GetLastError();
+  }
+  return error == ERROR_ALREADY_EXISTS && FolderExists(full) ? ERROR_SUCCESS : error;
+}
+
+std::wstring ExpandEnvironment(std::wstring_view text) {
+  const std::wstring source(text);
+  const DWORD size = ExpandEnvironmentStringsW(source.c_str(), nullptr, 0);
+  std::wstring expanded(size, L'\0');
+  const DWORD written = ExpandEnvironmentStringsW(source.c_str(), expanded.data(), size);
+  if (written == 0 || written > size) return source;
+  expanded.resize(written - 1);  // the count includes the terminator
+  return expanded;
+}

@@ -33,3 +33,9 @@ DWORD PublishPartialFile(std::wstring_view path);
 
 // One level, no parents. Only the current user, the administrators and the system may enter it.
 DWORD CreatePrivateFolder(std::wstring_view path);
+
+// Makes a folder and those of its parents that are missing, with the rights they inherit. One that is there is fine.
+DWORD CreateFolders(std::wstring_view path);
+
+// Replaces each %NAME% by the environment variable of that name; one that is not set stays as it is.
+std::wstring ExpandEnvironment(std::wstring_view text);

@@ -2,6 +2,7 @@
 
 #include <atomic>
 #include <cstdarg>
+#include <new>
 
 #include "core/format.h"
 #include "core/program_path.h"
@@ -13,7 +14,7 @@ namespace {
 // library when it is freed.
 SRWLOCK g_lock = SRWLOCK_INIT;
 CLogDLL* g_instance = nullptr;      // guarded by g_lock
-ErrorCapture* g_capture = nullptr;  // guarded by g_lock
+ErrorCapture* g_capture = nullptr;  // the innermost one; guarded by g_lock
 
 std::mutex g_bindMutex;
 std::weak_ptr<CLogDLL> g_shared;  // guarded by g_bindMutex
@@ -29,8 +30,6 @@ void ChangeListeners(Change change) {
   g_anyListener = (g_instance != nullptr && g_instance->IsBound()) || g_capture != nullptr;
   ReleaseSRWLockExclusive(&g_lock);
 }
-
-bool IsErrorOrWorse(Level level) { return static_cast<uint32_t>(level) <= static_cast<uint32_t>(Level::kError); }
 
 }  // namespace
 
@@ -88,42 +87,54 @@ void CLogDLL::MonitorSettings() const {
 bool IsEnabled() {
   if (!g_anyListener.load(std::memory_order_relaxed)) return false;
   AcquireSRWLockShared(&g_lock);
-  const bool enabled =
-      g_capture != nullptr || (g_instance != nullptr && g_instance->IsBound() &&
-                               (g_instance->m_isEnabled == nullptr || g_instance->m_isEnabled() != 0));
+  const bool enabled = g_capture != nullptr || (g_instance != nullptr && g_instance->IsBound() &&
+                                                (g_instance->m_isEnabled == nullptr || g_instance->m_isEnabled() != 0));
   ReleaseSRWLockShared(&g_lock);
   return enabled;
 }
 
-Route::Route(Level level) {
+Route::Route(Level level) : m_level(level) {
   AcquireSRWLockShared(&g_lock);
-  m_captures = g_capture != nullptr && IsErrorOrWorse(level);
+  for (const ErrorCapture* capture = g_capture; capture != nullptr; capture = capture->m_outer) {
+    m_captures = m_captures || capture->Wants(level);
+  }
 }
 
-Route::~Route() { ReleaseSRWLockShared(&g_lock); }
+Route::~Route() {
+  ReleaseSRWLockShared(&g_lock);
+}
 
-decltype(&LogWrite) Route::LibraryWrite() const { return g_instance == nullptr ? nullptr : g_instance->m_write; }
+decltype(&LogWrite) Route::LibraryWrite() const {
+  return g_instance == nullptr ? nullptr : g_instance->m_write;
+}
 
-void Route::Capture(const wchar_t* function, const wchar_t* format, ...) const {
+void Route::Capture(const wchar_t* function, const wchar_t* format, ...) const noexcept {
+  if (function == nullptr || format == nullptr) return;
   va_list arguments;
   va_start(arguments, format);
-  std::wstring text = FormatV(format, arguments);
+  try {
+    const std::wstring line = std::wstring(function) + L": " + FormatV(format, arguments);
+    for (ErrorCapture* capture = g_capture; capture != nullptr; capture = capture->m_outer) {
+      if (capture->Wants(m_level)) capture->Add(line);
+    }
+  } catch (const std::bad_alloc&) {
+    // A log line must never be what ends the program.
+  }
   va_end(arguments);
-  g_capture->Add(std::wstring(function) + L": " + text);
 }
 
-ErrorCapture::ErrorCapture() {
-  ChangeListeners([this] { g_capture = this; });
+ErrorCapture::ErrorCapture(Level least) : m_least(least) {
+  ChangeListeners([this] { m_outer = std::exchange(g_capture, this); });
 }
 
 ErrorCapture::~ErrorCapture() {
-  ChangeListeners([] { g_capture = nullptr; });
+  ChangeListeners([this] { g_capture = m_outer; });
 }
 
-void ErrorCapture::Add(std::wstring line) {
+void ErrorCapture::Add(const std::wstring& line) {
   const std::lock_guard lock(m_mutex);
   if (m_lines.size() < kMostLines) {
-    m_lines.push_back(std::move(line));
+    m_lines.push_back(line);
   } else {
     ++m_dropped;
   }

@@ -76,11 +76,12 @@ class CLogDLL {
 // True when a line would go anywhere: the library is bound and enabled, or an ErrorCapture listens.
 bool IsEnabled();
 
-// While one lives, the formatted text of every line of level error, critical and fatal of the whole process is kept as
-// well as written, also when no library is bound. At most one at a time; made and destroyed on one thread.
+// While one lives, the formatted text of every line of the whole process that is at least as grave as `least` is kept
+// as well as written, also when no library is bound. Captures nest: each gets every line. They are destroyed in the
+// reverse order of their making.
 class ErrorCapture {
  public:
-  ErrorCapture();
+  explicit ErrorCapture(Level least = Level::kError);
   ~ErrorCapture();
   ErrorCapture(const ErrorCapture&) = delete;
   ErrorCapture& operator=(const ErrorCapture&) = delete;
@@ -93,8 +94,11 @@ class ErrorCapture {
 
  private:
   friend class Route;
-  void Add(std::wstring line);
+  bool Wants(Level level) const { return static_cast<uint32_t>(level) <= static_cast<uint32_t>(m_least); }
+  void Add(const std::wstring& line);
 
+  const Level m_least;
+  ErrorCapture* m_outer = nullptr;  // fixed once this one listens
   std::mutex m_mutex;
   std::vector<std::wstring> m_lines;
   size_t m_dropped = 0;
@@ -110,11 +114,22 @@ class Route {
 
   decltype(&LogWrite) LibraryWrite() const;  // null when no library is bound
   bool Captures() const { return m_captures; }
-  void Capture(const wchar_t* function, const wchar_t* format, ...) const;
+  void Capture(const wchar_t* function, const wchar_t* format, ...) const noexcept;
 
  private:
-  bool m_captures;
+  Level m_level;
+  bool m_captures = false;
 };
+
+// A log argument as it passes through an ellipsis. A scoped enumeration is not promoted there as an integer is.
+template <class Argument>
+auto Promoted(Argument argument) {
+  if constexpr (std::is_enum_v<Argument>) {
+    return +static_cast<std::underlying_type_t<Argument>>(argument);
+  } else {
+    return argument;
+  }
+}
 
 // Writes one line, whatever IsEnabled says. What may stand for a printf conversion is a number, an enumeration or a
 // pointer: a std::wstring cannot pass by mistake.
@@ -125,16 +140,16 @@ void Write(int16_t step, Level level, const wchar_t* function, const wchar_t* fo
   const Route route(level);
   if (const auto write = route.LibraryWrite()) {
     const LogRecord record{static_cast<uint32_t>(level)};
-    write(step, &record, GetModuleHandleW(nullptr), function, format, arguments...);
+    write(step, &record, GetModuleHandleW(nullptr), function, format, Promoted(arguments)...);
   }
-  if (route.Captures()) route.Capture(function, format, arguments...);
+  if (route.Captures()) route.Capture(function, format, Promoted(arguments)...);
 }
 
 }  // namespace logging
 
-#define ST_LOG(level, function, ...)                                                                   \
-  do {                                                                                                 \
-    if (::logging::IsEnabled()) ::logging::Write(0, (level), (function), __VA_ARGS__);                 \
+#define ST_LOG(level, function, ...)                                                   \
+  do {                                                                                 \
+    if (::logging::IsEnabled()) ::logging::Write(0, (level), (function), __VA_ARGS__); \
   } while (false)
 
 #define LOG_FATAL(function, ...) ST_LOG(::logging::Level::kFatal, function, __VA_ARGS__)

@@ -58,6 +58,13 @@ struct FindHandleTraits {
 };
 using FindHandle = Scoped<FindHandleTraits>;  // FindFirstFile enumerations
 
+struct ChangeNotificationTraits {
+  using Type = HANDLE;
+  static bool IsValid(HANDLE handle) { return handle != nullptr && handle != INVALID_HANDLE_VALUE; }
+  static void Close(HANDLE handle) { FindCloseChangeNotification(handle); }
+};
+using ChangeNotification = Scoped<ChangeNotificationTraits>;  // FindFirstChangeNotification
+
 struct ModuleTraits {
   using Type = HMODULE;
   static bool IsValid(HMODULE module) { return module != nullptr; }

@@ -1,12 +1,15 @@
 // The C interface of the logging library, `log.dll`. The library writes log files; which ones, where and how much of
 // them is said by its settings, an XML file (docs/formats.md). Any thread may call any function at any time between
 // LogInit and LogDeinit; the library serialises writes itself. Strings are UTF-16 and zero-terminated and are copied
-// before a function returns. Unless said otherwise a function returns 0 on success and a Windows error number otherwise.
+// before a function returns. Unless said otherwise a function returns 0 on success and a Windows error number
+// otherwise.
 #pragma once
 
 #include <windows.h>
 
 #include <stdint.h>
+
+#include "interfaces/log_constants.h"
 
 #ifdef __cplusplus
 extern "C" {
@@ -17,35 +20,6 @@ extern "C" {
 #else
 #define ST_LOG_API
 #endif
-
-// Level bits. A record has one of them; a mask has any.
-enum {
-  LOG_LEVEL_FATAL = 1,
-  LOG_LEVEL_CRITICAL = 2,
-  LOG_LEVEL_ERROR = 4,
-  LOG_LEVEL_WARNING = 8,
-  LOG_LEVEL_INFO = 16,
-  LOG_LEVEL_TRACE = 32,
-  LOG_LEVEL_ALL = 63
-};
-
-// How finely the log is divided into files.
-enum {
-  LOG_DEPTH_EXE = 0,    // one file for each program:             <program>.log
-  LOG_DEPTH_MODULE = 1  // one file for each module of a program: <program>.<module>.log
-};
-
-// Where lines go; bits.
-enum {
-  LOG_TYPE_FILE = 1,     // log files
-  LOG_TYPE_DEBUGGER = 2  // OutputDebugString
-};
-
-// What the first write of a process does with a log file that is already there.
-enum {
-  LOG_MODE_APPEND = 0,   // goes on behind its last line
-  LOG_MODE_OVERWRITE = 1  // moves it aside as if it were full, and begins anew
-};
 
 // What is known of a line besides its text. Later versions may add fields behind `level`.
 typedef struct LogRecord {
@@ -71,17 +45,17 @@ ST_LOG_API int32_t LogSetMode(uint32_t mode);
 ST_LOG_API int32_t LogSetMaxSize(uint64_t bytes);  // of one file; 0: no limit
 ST_LOG_API int32_t LogSetDepth(uint32_t depth);
 
-ST_LOG_API uint32_t LogGetLevel(void);    // the mask in force
-ST_LOG_API int32_t LogIsEnabled(void);    // 1 or 0; one atomic read
+ST_LOG_API uint32_t LogGetLevel(void);  // the mask in force
+ST_LOG_API int32_t LogIsEnabled(void);  // 1 or 0; one atomic read
 
 // Writes one line. `step` is +1 for a scope entry, -1 for a scope exit, 0 otherwise, and indents the calling thread's
-// lines. `format` has Microsoft's meaning: %s is wide, %S narrow. When the call returns, the line has been handed to the
-// system: it is in the file even if the process is killed right after.
+// lines. `format` has Microsoft's meaning: %s is wide, %S narrow. When the call returns, the line has been handed to
+// the system: it is in the file even if the process is killed right after.
 ST_LOG_API void LogWrite(int16_t step, const LogRecord* record, HMODULE module, const wchar_t* function,
                          const wchar_t* format, ...);
 
-// Counts a named event; the counts are written as info lines by LogUninitDeskMetrics and LogDeinit. The second form also
-// writes `data` as an info line at once.
+// Counts a named event; the counts are written as info lines by LogUninitDeskMetrics and LogDeinit. The second form
+// also writes `data` as an info line at once.
 ST_LOG_API int32_t LogTrackEvent(const wchar_t* category, const wchar_t* name);
 ST_LOG_API int32_t LogTrackEventData(const wchar_t* category, const wchar_t* name, const wchar_t* data);
 ST_LOG_API int32_t LogUninitDeskMetrics(void);
