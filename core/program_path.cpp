@@ -2,15 +2,35 @@
 
 #include <windows.h>
 
-std::wstring ProgramPath() {
+namespace {
+
+std::wstring PathOf(HMODULE module) {
   constexpr DWORD kLongestPath = 32767;
   std::wstring path(kLongestPath + 1, L'\0');
-  path.resize(GetModuleFileNameW(nullptr, path.data(), kLongestPath + 1));
+  path.resize(GetModuleFileNameW(module, path.data(), kLongestPath + 1));
   return path;
 }
 
-std::wstring ProgramFolder() {
-  const std::wstring path = ProgramPath();
+std::wstring FolderOf(const std::wstring& path) {
   const size_t separator = path.find_last_of(L"\\/");
   return separator == std::wstring::npos ? std::wstring() : path.substr(0, separator);
+}
+
+}  // namespace
+
+std::wstring ProgramPath() {
+  return PathOf(nullptr);
+}
+
+std::wstring ProgramFolder() {
+  return FolderOf(ProgramPath());
+}
+
+std::wstring ModuleFolder(const void* address) {
+  HMODULE module = nullptr;
+  if (!GetModuleHandleExW(GET_MODULE_HANDLE_EX_FLAG_FROM_ADDRESS | GET_MODULE_HANDLE_EX_FLAG_UNCHANGED_REFCOUNT,
+                          static_cast<const wchar_t*>(address), &module)) {
+    return {};
+  }
+  return FolderOf(PathOf(module));
 }
