@@ -6,14 +6,14 @@
 #include <algorithm>
 #include <vector>
 
-#include "core/scoped.h"
-
 namespace {
 
 constexpr std::wstring_view kLocalPrefix = L"\\\\?\\";
 constexpr std::wstring_view kNetworkPrefix = L"\\\\?\\UNC\\";
 
-bool IsDriveAbsolute(std::wstring_view path) { return path.size() >= 3 && path[1] == L':' && path[2] == L'\\'; }
+bool IsDriveAbsolute(std::wstring_view path) {
+  return path.size() >= 3 && path[1] == L':' && path[2] == L'\\';
+}
 
 // Removes "." and "..", and doubled separators, from what follows the first `rootLength` characters.
 std::wstring WithoutDots(std::wstring_view path, size_t rootLength) {
@@ -64,7 +64,7 @@ DWORD WriteAll(HANDLE file, std::string_view bytes) {
     if (written == 0) return ERROR_WRITE_FAULT;
     bytes.remove_prefix(written);
   }
-  return FlushFileBuffers(file) ? ERROR_SUCCESS : GetLastError();
+  return ERROR_SUCCESS;
 }
 
 }  // namespace
@@ -111,8 +111,10 @@ bool FolderExists(std::wstring_view path) {
 }
 
 DWORD ReadWholeFile(std::wstring_view path, uint64_t limit, std::string& bytes) {
-  const KernelHandle file(CreateFileW(ExtendedPath(path).c_str(), GENERIC_READ, FILE_SHARE_READ | FILE_SHARE_WRITE,
-                                      nullptr, OPEN_EXISTING, FILE_FLAG_SEQUENTIAL_SCAN, nullptr));
+  // All sharing: neither who writes a log nor who replaces a settings file by renaming is to be disturbed.
+  constexpr DWORD kShareAll = FILE_SHARE_READ | FILE_SHARE_WRITE | FILE_SHARE_DELETE;
+  const KernelHandle file(CreateFileW(ExtendedPath(path).c_str(), GENERIC_READ, kShareAll, nullptr, OPEN_EXISTING,
+                                      FILE_FLAG_SEQUENTIAL_SCAN, nullptr));
   if (!file) return GetLastError();
   LARGE_INTEGER size{};
   if (!GetFileSizeEx(file.Get(), &size)) return GetLastError();
@@ -134,16 +136,39 @@ DWORD ReadWholeFile(std::wstring_view path, uint64_t limit, std::string& bytes) 
 }
 
 DWORD WriteWholeFile(std::wstring_view path, std::string_view bytes) {
-  const std::wstring partial = ExtendedPath(path) + kPartialSuffix;
-  DWORD error = ERROR_SUCCESS;
-  {
-    const KernelHandle file(
-        CreateFileW(partial.c_str(), GENERIC_WRITE, 0, nullptr, CREATE_ALWAYS, FILE_ATTRIBUTE_NORMAL, nullptr));
-    if (!file) return GetLastError();
-    error = WriteAll(file.Get(), bytes);
-  }
-  if (error == ERROR_SUCCESS) error = PublishPartialFile(path);
-  if (error != ERROR_SUCCESS) DeleteFileW(partial.c_str());
+  PartialFile file(path);
+  DWORD error = file.Create();
+  if (error == ERROR_SUCCESS) error = file.Write(bytes);
+  if (error == ERROR_SUCCESS) error = file.Publish();
+  return error;
+}
+
+PartialFile::~PartialFile() {
+  m_file.Reset();
+  if (m_isCreated) DeleteFileW((m_path + kPartialSuffix).c_str());
+}
+
+DWORD PartialFile::Create() {
+  m_file.Reset(CreateFileW((m_path + kPartialSuffix).c_str(), GENERIC_WRITE, 0, nullptr, CREATE_ALWAYS,
+                           FILE_ATTRIBUTE_NORMAL, nullptr));
+  if (!m_file) return GetLastError();
+  m_isCreated = true;
+  return ERROR_SUCCESS;
+}
+
+DWORD PartialFile::Write(std::string_view bytes) {
+  return WriteAll(m_file.Get(), bytes);
+}
+
+DWORD PartialFile::Flush() {
+  return FlushFileBuffers(m_file.Get()) ? ERROR_SUCCESS : GetLastError();
+}
+
+DWORD PartialFile::Publish() {
+  if (const DWORD flushError = Flush(); flushError != ERROR_SUCCESS) return flushError;
+  m_file.Reset();
+  const DWORD error = PublishPartialFile(m_path);
+  if (error == ERROR_SUCCESS) m_isCreated = false;
   return error;
 }
 
@@ -178,7 +203,7 @@ DWORD CreateFolders(std::wstring_view path) {
 }
 
 std::wstring ExpandEnvironment(std::wstring_view text) {
-  const std::wstring source(text);
+  std::wstring source(text);
   const DWORD size = ExpandEnvironmentStringsW(source.c_str(), nullptr, 0);
   std::wstring expanded(size, L'\0');
   const DWORD written = ExpandEnvironmentStringsW(source.c_str(), expanded.data(), size);

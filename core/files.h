@@ -8,9 +8,12 @@
 #include <string>
 #include <string_view>
 
+#include "core/scoped.h"
+
 // The form of a path that has no length limit and keeps trailing dots and spaces: absolute, with the prefix \\?\ (or
 // \\?\UNC\). Relative paths are resolved against the current directory, "." and ".." are removed, and "/" becomes "\".
-// Every function of this program that opens, lists or deletes by a path passes it through here. An empty path stays empty.
+// Every function of this program that opens, lists or deletes by a path passes it through here. An empty path stays
+// empty.
 std::wstring ExtendedPath(std::wstring_view path);
 
 // The same without asking the system; `currentDirectory` is absolute.
@@ -22,11 +25,31 @@ bool FolderExists(std::wstring_view path);  // a folder
 // Reads a whole file into `bytes`. ERROR_FILE_TOO_LARGE when it is longer than `limit`; nothing is read then.
 DWORD ReadWholeFile(std::wstring_view path, uint64_t limit, std::string& bytes);
 
-// Writes a whole file, replacing an older one. The bytes go to "<path>.partial", are flushed to the disk and renamed, so
-// that whatever happens no half-written file ever stands under `path`.
+// Writes a whole file, replacing an older one. The bytes go to "<path>.partial", are flushed to the disk and renamed,
+// so that whatever happens no half-written file ever stands under `path`.
 DWORD WriteWholeFile(std::wstring_view path, std::string_view bytes);
 
 inline constexpr wchar_t kPartialSuffix[] = L".partial";
+
+// The same for a file that is written piece by piece: it stands under `path` only when Publish has succeeded. What was
+// not published is deleted with its owner.
+class PartialFile {
+ public:
+  explicit PartialFile(std::wstring_view path) : m_path(ExtendedPath(path)) {}
+  ~PartialFile();
+  PartialFile(const PartialFile&) = delete;
+  PartialFile& operator=(const PartialFile&) = delete;
+
+  DWORD Create();  // first
+  DWORD Write(std::string_view bytes);
+  DWORD Flush();    // what was written so far, so that Publish has less to wait for
+  DWORD Publish();  // last; flushes to the disk, closes and renames
+
+ private:
+  const std::wstring m_path;  // extended
+  KernelHandle m_file;
+  bool m_isCreated = false;
+};
 
 // Makes a finished "<path>.partial" the file `path`, replacing an older one. On failure the partial file stays.
 DWORD PublishPartialFile(std::wstring_view path);

@@ -23,6 +23,10 @@ bool ParseJson(std::string_view text, Json::Value& value, std::string& error) {
   return false;
 }
 
-std::string WriteStyledJson(const Json::Value& value) { return Json::StyledWriter().write(value); }
+std::string WriteStyledJson(const Json::Value& value) {
+  return Json::StyledWriter().write(value);
+}
 
-std::string WriteCompactJson(const Json::Value& value) { return Json::FastWriter().write(value); }
+std::string WriteCompactJson(const Json::Value& value) {
+  return Json::FastWriter().write(value);
+}

@@ -8,8 +8,8 @@
 #include <string_view>
 
 // Comments and a UTF-8 byte-order mark are accepted and dropped. False when `text` is not a JSON document, or nests
-// deeper than 1,000 levels; `error` then holds the reader's message, several lines, and `value` is null. What follows the
-// end of the document is not looked at, as the library's reader has it.
+// deeper than 1,000 levels; `error` then holds the reader's message, several lines, and `value` is null. What follows
+// the end of the document is not looked at, as the library's reader has it.
 bool ParseJson(std::string_view text, Json::Value& value, std::string& error);
 
 std::string WriteStyledJson(const Json::Value& value);   // indented by 3 spaces, right margin 74 columns

@@ -4,7 +4,7 @@
 
 namespace {
 
-std::wstring PathOf(HMODULE module) {
+std::wstring ModulePath(HMODULE module) {
   constexpr DWORD kLongestPath = 32767;
   std::wstring path(kLongestPath + 1, L'\0');
   path.resize(GetModuleFileNameW(module, path.data(), kLongestPath + 1));
@@ -19,18 +19,16 @@ std::wstring FolderOf(const std::wstring& path) {
 }  // namespace
 
 std::wstring ProgramPath() {
-  return PathOf(nullptr);
+  return ModulePath(nullptr);
 }
 
 std::wstring ProgramFolder() {
   return FolderOf(ProgramPath());
 }
 
-std::wstring ModuleFolder(const void* address) {
+std::wstring OwnModuleFolder() {
   HMODULE module = nullptr;
-  if (!GetModuleHandleExW(GET_MODULE_HANDLE_EX_FLAG_FROM_ADDRESS | GET_MODULE_HANDLE_EX_FLAG_UNCHANGED_REFCOUNT,
-                          static_cast<const wchar_t*>(address), &module)) {
-    return {};
-  }
-  return FolderOf(PathOf(module));
+  GetModuleHandleExW(GET_MODULE_HANDLE_EX_FLAG_FROM_ADDRESS | GET_MODULE_HANDLE_EX_FLAG_UNCHANGED_REFCOUNT,
+                     reinterpret_cast<LPCWSTR>(&OwnModuleFolder), &module);
+  return FolderOf(ModulePath(module));
 }

@@ -1,4 +1,5 @@
-// Where the running program and its libraries lie. The program's values are fixed for the life of the process.
+// Where the running program, and the module that this code is linked into, lie. The values are fixed for the life of
+// the process.
 #pragma once
 
 #include <string>
@@ -6,5 +7,5 @@
 std::wstring ProgramPath();    // full path of the executable, up to 32,767 characters
 std::wstring ProgramFolder();  // its folder, without a trailing separator
 
-// The folder, without a trailing separator, of the program or library that a function or global object belongs to.
-std::wstring ModuleFolder(const void* address);
+// The folder of the library, or program, that the caller is linked into. A run-time library finds its own files there.
+std::wstring OwnModuleFolder();

@@ -2,8 +2,8 @@
 // too. The lines of nested scopes are indented by the logging library. A traced function opens one as its first action.
 #pragma once
 
-#include <cstdint>
 #include <cstddef>
+#include <cstdint>
 
 namespace logging {
 

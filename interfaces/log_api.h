@@ -1,5 +1,5 @@
 // The C interface of the logging library, `log.dll`. The library writes log files; which ones, where and how much of
-// them is said by its settings, an XML file (docs/formats.md). Any thread may call any function at any time between
+// them is said by its settings, an XML file (docs/log.md). Any thread may call any function at any time between
 // LogInit and LogDeinit; the library serialises writes itself. Strings are UTF-16 and zero-terminated and are copied
 // before a function returns. Unless said otherwise a function returns 0 on success and a Windows error number
 // otherwise.
@@ -26,7 +26,9 @@ typedef struct LogRecord {
   uint32_t level;
 } LogRecord;
 
-// Prepares the library for this process; counts its calls. LogDeinit undoes one call; the last one closes the files.
+// Prepares the library for this process, with its default settings; counts its calls. LogDeinit undoes one call; the
+// last one ends the watching of the settings and closes the files, after which the library may be freed. Neither may be
+// called from DllMain. Before the first LogInit and after the last LogDeinit every other function does nothing.
 ST_LOG_API int32_t LogInit(void);
 ST_LOG_API int32_t LogDeinit(void);
 
@@ -48,9 +50,10 @@ ST_LOG_API int32_t LogSetDepth(uint32_t depth);
 ST_LOG_API uint32_t LogGetLevel(void);  // the mask in force
 ST_LOG_API int32_t LogIsEnabled(void);  // 1 or 0; one atomic read
 
-// Writes one line. `step` is +1 for a scope entry, -1 for a scope exit, 0 otherwise, and indents the calling thread's
-// lines. `format` has Microsoft's meaning: %s is wide, %S narrow. When the call returns, the line has been handed to
-// the system: it is in the file even if the process is killed right after.
+// Writes one line; no argument may make it fail (without a record the line is a trace line). `step` is +1 for a scope
+// entry, -1 for a scope exit, 0 otherwise, and indents the calling thread's lines. `format` has Microsoft's meaning: %s
+// is wide, %S narrow. When the call returns, the line has been handed to the system: it is in the file even if the
+// process is killed right after.
 ST_LOG_API void LogWrite(int16_t step, const LogRecord* record, HMODULE module, const wchar_t* function,
                          const wchar_t* format, ...);
 

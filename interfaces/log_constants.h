@@ -12,7 +12,7 @@ enum {
   LOG_LEVEL_ALL = 63
 };
 
-// How finely the log is divided into files.
+// How finely the log is divided into files. A second instance of the program adds "-2" to <program>, and so on.
 enum {
   LOG_DEPTH_EXE = 0,    // one file for each program:             <program>.log
   LOG_DEPTH_MODULE = 1  // one file for each module of a program: <program>.<module>.log

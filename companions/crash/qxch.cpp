@@ -60,7 +60,7 @@ DWORD Enable() {
   std::shared_ptr<logging::CLogDLL> log;
   if (GetModuleHandleW(L"log.dll") != nullptr) log = logging::CLogDLL::Get();
 
-  const std::wstring libraryFolder = ModuleFolder(&g_handler);
+  const std::wstring libraryFolder = OwnModuleFolder();
   const crash::Settings settings = ReadSettings(libraryFolder);
   const std::wstring folder = ExtendPath(ExpandEnvironment(ToWide(settings.dumpPath)), libraryFolder);
   const crash::PreparedFolder prepared = crash::PrepareFolder(folder, settings.dumpCount);

@@ -19,7 +19,11 @@ using logfile::Settings;
 // Shared while any function is at work, exclusive while the logger comes and goes.
 SharedLock g_lifetime;
 std::unique_ptr<Logger> g_logger;  // guarded by g_lifetime
-unsigned g_references = 0;         // guarded by g_lifetime
+
+// One LogInit or LogDeinit at a time; taken before g_lifetime.
+SharedLock g_initialising;
+unsigned g_references = 0;  // guarded by g_initialising
+
 std::atomic<uint32_t> g_wanted{0};
 
 // Runs `job(logger)`, which returns a Windows error number. ERROR_NOT_READY before LogInit and after LogDeinit.
@@ -52,8 +56,12 @@ bool IsText(const wchar_t* text) {
 
 int32_t LogInit() {
   try {
-    const std::lock_guard lock(g_lifetime);
-    if (!g_logger) g_logger = std::make_unique<Logger>(g_wanted);
+    const std::lock_guard initialising(g_initialising);
+    if (g_references == 0) {
+      auto logger = std::make_unique<Logger>(g_wanted);
+      const std::lock_guard lock(g_lifetime);
+      g_logger = std::move(logger);
+    }
     ++g_references;
     return ERROR_SUCCESS;
   } catch (const std::bad_alloc&) {
@@ -62,14 +70,16 @@ int32_t LogInit() {
 }
 
 int32_t LogDeinit() {
+  const std::lock_guard initialising(g_initialising);
+  if (g_references == 0) return ERROR_NOT_READY;
+  if (--g_references > 0) return ERROR_SUCCESS;
   std::unique_ptr<Logger> last;
   {
     const std::lock_guard lock(g_lifetime);
-    if (g_references == 0) return ERROR_NOT_READY;
-    if (--g_references > 0) return ERROR_SUCCESS;
     last = std::move(g_logger);
   }
-  // Nobody is inside any more, and nobody can get in: what ends here may take its time and needs no lock.
+  // Nobody is inside the logger any more. Its watcher is waited for without g_lifetime: the end of a thread needs the
+  // loader's lock, and who holds that may be waiting to write a line.
   int32_t error = ERROR_SUCCESS;
   try {
     last->Finish();
@@ -77,6 +87,7 @@ int32_t LogDeinit() {
     error = ERROR_NOT_ENOUGH_MEMORY;
   }
   last.reset();
+  g_wanted = 0;
   return error;
 }
 

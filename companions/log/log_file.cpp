@@ -12,7 +12,7 @@ namespace {
 // A folder that cannot be written is not asked again for every line.
 constexpr ULONGLONG kOpenInterval = 1000;
 // How much more goes into a full file that cannot be moved (a viewer holds it) before it is tried again.
-constexpr uint64_t kRotationRetryBytes = 64 * 1024;
+constexpr uint64_t kRotationRetryBytes = uint64_t{64} << 10;
 
 bool EndsInLine(HANDLE file, uint64_t size) {
   if (size == 0) return true;

@@ -22,6 +22,8 @@ struct Settings {
   uint32_t mode = LOG_MODE_APPEND;
   uint64_t maxBytes = uint64_t{10} << 20;  // of one file; 0: no limit
   uint32_t oldFiles = 5;
+
+  bool operator==(const Settings&) const = default;
 };
 
 inline constexpr uint32_t kMostOldFiles = 99;

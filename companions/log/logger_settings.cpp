@@ -11,6 +11,15 @@ namespace {
 constexpr uint64_t kMostSettingsBytes = uint64_t{1} << 20;
 constexpr size_t kMostEvents = 1000;  // different ones; more are counted together
 
+// Absolute and without the prefix "\\?\", behind which "/" and ".." of a relative log folder would be taken literally.
+std::wstring FullPath(std::wstring_view path) {
+  constexpr std::wstring_view kNetworkPrefix = L"\\\\?\\UNC\\";
+  constexpr std::wstring_view kLocalPrefix = L"\\\\?\\";
+  const std::wstring full = ExtendedPath(path);
+  if (full.starts_with(kNetworkPrefix)) return L"\\\\" + full.substr(kNetworkPrefix.size());
+  return full.starts_with(kLocalPrefix) ? full.substr(kLocalPrefix.size()) : full;
+}
+
 std::wstring FolderOf(const std::wstring& path) {
   return path.substr(0, path.find_last_of(L'\\'));
 }
@@ -25,9 +34,9 @@ DWORD Logger::SetSettingsFile(std::wstring_view path) {
     const std::lock_guard reloadLock(m_reloadLock);
     m_lastRead = {kNothingRead, {}};
     const std::lock_guard lock(m_lock);
-    m_settingsPath = ExtendedPath(path);
+    m_settingsPath = FullPath(path);
   }
-  if (monitored) m_watcher = std::make_unique<SettingsWatcher>(ExtendedPath(path), WatcherCallback());
+  if (monitored) m_watcher = std::make_unique<SettingsWatcher>(FullPath(path), WatcherCallback());
   return ERROR_SUCCESS;
 }
 

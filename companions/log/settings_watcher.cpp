@@ -1,5 +1,7 @@
 #include "companions/log/settings_watcher.h"
 
+#include "core/files.h"
+
 namespace logfile {
 namespace {
 
@@ -19,7 +21,7 @@ HMODULE ReferenceToOwnModule() {
 
 }  // namespace
 
-SettingsWatcher::SettingsWatcher(std::wstring path, Changed changed)
+SettingsWatcher::SettingsWatcher(const std::wstring& path, Changed changed)
     : m_folder(path.substr(0, path.find_last_of(L'\\'))),
       m_changed(std::move(changed)),
       m_stop(CreateEventW(nullptr, TRUE, FALSE, nullptr)) {
@@ -45,7 +47,7 @@ DWORD WINAPI SettingsWatcher::ThreadMain(void* self) {
 void SettingsWatcher::Arm() {
   if (m_notification && FindNextChangeNotification(m_notification.Get())) return;
   constexpr DWORD kWhat = FILE_NOTIFY_CHANGE_FILE_NAME | FILE_NOTIFY_CHANGE_LAST_WRITE | FILE_NOTIFY_CHANGE_SIZE;
-  m_notification.Reset(FindFirstChangeNotificationW(m_folder.c_str(), FALSE, kWhat));
+  m_notification.Reset(FindFirstChangeNotificationW(ExtendedPath(m_folder).c_str(), FALSE, kWhat));
 }
 
 // False when the thread is to end.

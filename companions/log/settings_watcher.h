@@ -17,7 +17,7 @@ class SettingsWatcher {
   using Changed = std::function<bool(bool last)>;
 
   // `path` is absolute. A folder that is not there or cannot be watched is looked at every two seconds.
-  SettingsWatcher(std::wstring path, Changed changed);
+  SettingsWatcher(const std::wstring& path, Changed changed);
   // Ends the thread and waits for it. Not from DllMain.
   ~SettingsWatcher();
   SettingsWatcher(const SettingsWatcher&) = delete;

@@ -1,0 +1,143 @@
+#include "app/output_folder.h"
+
+#include <windows.h>
+
+#include <shlobj.h>
+
+#include <algorithm>
+
+#include "core/files.h"
+#include "core/program_path.h"
+#include "core/scoped.h"
+
+namespace {
+
+constexpr std::wstring_view kLocalPrefix = L"\\\\?\\";
+constexpr std::wstring_view kNetworkPrefix = L"\\\\?\\UNC\\";
+
+bool EqualIgnoringCase(std::wstring_view a, std::wstring_view b) {
+  return a.size() == b.size() && CompareStringOrdinal(a.data(), static_cast<int>(a.size()), b.data(),
+                                                      static_cast<int>(b.size()), TRUE) == CSTR_EQUAL;
+}
+
+std::wstring_view WithoutEndSeparators(std::wstring_view path) {
+  while (path.ends_with(L'\\'))
+    path.remove_suffix(1);
+  return path;
+}
+
+// `inner` is `outer` or lies in it.
+bool Contains(std::wstring_view outer, std::wstring_view inner) {
+  outer = WithoutEndSeparators(outer);
+  inner = WithoutEndSeparators(inner);
+  if (inner.size() > outer.size() && inner[outer.size()] != L'\\') return false;
+  return EqualIgnoringCase(outer, inner.substr(0, outer.size()));
+}
+
+struct FolderPlace {
+  std::wstring_view path;  // behind the prefix
+  size_t rootParts;        // parts of the path that name its root; 0 when it is neither on a drive nor on a share
+};
+
+FolderPlace PlaceOf(std::wstring_view folder) {
+  if (folder.starts_with(kNetworkPrefix)) return {folder.substr(kNetworkPrefix.size()), 2};  // server, share
+  if (!folder.starts_with(kLocalPrefix)) return {folder, 0};
+  folder.remove_prefix(kLocalPrefix.size());
+  constexpr std::wstring_view kVolume = L"Volume{";
+  const bool isDrive = folder.size() >= 2 && folder[1] == L':' && (folder.size() == 2 || folder[2] == L'\\');
+  return {folder, isDrive || EqualIgnoringCase(folder.substr(0, kVolume.size()), kVolume) ? size_t{1} : size_t{0}};
+}
+
+struct KnownFolder {
+  const KNOWNFOLDERID& id;
+  const wchar_t* what;
+};
+
+const KnownFolder kKnownFolders[] = {
+    {FOLDERID_Profile, L"the user's profile"},
+    {FOLDERID_Desktop, L"the desktop"},
+    {FOLDERID_Documents, L"the user's documents"},
+    {FOLDERID_Downloads, L"the user's downloads"},
+    {FOLDERID_Pictures, L"the user's pictures"},
+    {FOLDERID_Music, L"the user's music"},
+    {FOLDERID_Videos, L"the user's videos"},
+    {FOLDERID_RoamingAppData, L"the user's program data"},
+    {FOLDERID_LocalAppData, L"the user's local program data"},
+    {FOLDERID_ProgramData, L"the programs' common data"},
+    {FOLDERID_ProgramFiles, L"the programs folder"},
+    {FOLDERID_ProgramFilesX86, L"the 32-bit programs folder"},
+    {FOLDERID_Windows, L"the Windows folder"},
+    {FOLDERID_System, L"the Windows system folder"},
+};
+
+struct TaskMemoryTraits {
+  using Type = wchar_t*;
+  static bool IsValid(wchar_t* memory) { return memory != nullptr; }
+  static void Close(wchar_t* memory) { CoTaskMemFree(memory); }
+};
+using TaskMemoryText = Scoped<TaskMemoryTraits>;
+
+KernelHandle OpenForAttributes(const std::wstring& extended, DWORD flags) {
+  return KernelHandle(CreateFileW(extended.c_str(), FILE_READ_ATTRIBUTES,
+                                  FILE_SHARE_READ | FILE_SHARE_WRITE | FILE_SHARE_DELETE, nullptr, OPEN_EXISTING, flags,
+                                  nullptr));
+}
+
+// Where the system says the folder really is; empty when it cannot be asked.
+std::wstring FinalPath(const std::wstring& extended) {
+  const KernelHandle folder = OpenForAttributes(extended, FILE_FLAG_BACKUP_SEMANTICS);
+  if (!folder) return {};
+  constexpr DWORD kLongestPath = 32767;
+  std::wstring path(kLongestPath + 1, L'\0');
+  const DWORD length = GetFinalPathNameByHandleW(folder.Get(), path.data(), kLongestPath + 1, FILE_NAME_NORMALIZED);
+  path.resize(length <= kLongestPath ? length : 0);
+  return path;
+}
+
+}  // namespace
+
+std::wstring OutputFolderRefusal(std::wstring_view folder, const std::vector<ProtectedFolder>& protectedFolders) {
+  if (folder.empty()) return L"no folder is named";
+  if (folder.find(L'\0') != std::wstring_view::npos) return L"the name holds a zero character";
+  const FolderPlace place = PlaceOf(folder);
+  if (place.rootParts == 0) return L"it is not on a drive or a network share";
+  const std::wstring_view path = WithoutEndSeparators(place.path);
+  const auto separators = static_cast<size_t>(std::count(path.begin(), path.end(), L'\\'));
+  if (separators < place.rootParts) return L"it is the root of a drive or a network share";
+  for (const ProtectedFolder& entry : protectedFolders) {
+    if (!entry.path.empty() && Contains(folder, entry.path)) return std::wstring(L"it is, or holds, ") + entry.what;
+  }
+  return {};
+}
+
+std::wstring NormalFolder(std::wstring_view folder) {
+  std::wstring extended = ExtendedPath(folder);
+  if (extended.find(L'\0') != std::wstring::npos) return extended;
+  std::wstring final = FinalPath(extended);
+  return final.starts_with(kLocalPrefix) ? final : extended;
+}
+
+bool IsFolderLink(std::wstring_view folder) {
+  const KernelHandle handle =
+      OpenForAttributes(ExtendedPath(folder), FILE_FLAG_BACKUP_SEMANTICS | FILE_FLAG_OPEN_REPARSE_POINT);
+  FILE_ATTRIBUTE_TAG_INFO info{};
+  return handle && GetFileInformationByHandleEx(handle.Get(), FileAttributeTagInfo, &info, sizeof info) &&
+         (info.FileAttributes & FILE_ATTRIBUTE_REPARSE_POINT) != 0 && IsReparseTagNameSurrogate(info.ReparseTag);
+}
+
+std::vector<ProtectedFolder> ProtectedFolders() {
+  std::vector<ProtectedFolder> folders;
+  folders.push_back({NormalFolder(L"."), L"the current directory"});
+  folders.push_back({NormalFolder(ProgramFolder()), L"the program's folder"});
+  for (const KnownFolder& known : kKnownFolders) {
+    TaskMemoryText path;
+    if (SUCCEEDED(SHGetKnownFolderPath(known.id, KF_FLAG_DONT_VERIFY, nullptr, path.Receive()))) {
+      folders.push_back({NormalFolder(path.Get()), known.what});
+    }
+  }
+  wchar_t temporary[MAX_PATH + 2] = {};
+  if (GetTempPathW(MAX_PATH + 1, temporary) != 0) {
+    folders.push_back({NormalFolder(temporary), L"the temporary folder"});
+  }
+  return folders;
+}

@@ -1,0 +1,24 @@
+#include "systeminfo/collector_table.h"
+
+#include "systeminfo/system_summary.h"
+
+namespace systeminfo {
+namespace {
+
+template <class Collector>
+std::shared_ptr<ICollector> Make(std::wstring name) {
+  return std::make_shared<Collector>(std::move(name));
+}
+
+// The only list. A collector that writes the same file as an earlier one replaces it.
+constexpr CollectorRow kCollectors[] = {
+    {L"system_summary", L"SystemSummary", &Make<SystemSummary>},
+};
+
+}  // namespace
+
+std::span<const CollectorRow> CollectorTable() {
+  return kCollectors;
+}
+
+}  // namespace systeminfo

@@ -1,0 +1,202 @@
+#include "systeminfo/data_collector.h"
+
+#include <windows.h>
+
+#include <algorithm>
+#include <chrono>
+#include <exception>
+#include <utility>
+
+#include "core/files.h"
+#include "core/format.h"
+#include "core/json.h"
+#include "core/logging.h"
+#include "core/paths.h"
+#include "core/text.h"
+#include "systeminfo/collector_table.h"
+#include "systeminfo/settings_check.h"
+#include "systeminfo/settings_document.h"
+#include "systeminfo/wmi_wrapper.h"
+
+namespace systeminfo {
+namespace {
+
+constexpr wchar_t kBuildCollectors[] = L"systeminfo::DataCollectorImpl::BuildCollectors";
+constexpr wchar_t kGetOutputFolder[] = L"systeminfo::DataCollectorImpl::GetOutputFolder";
+constexpr wchar_t kCreateOutputFolder[] = L"systeminfo::DataCollectorImpl::CreateOutputFolder";
+constexpr wchar_t kRunCollectors[] = L"systeminfo::DataCollectorImpl::RunCollectors";
+constexpr wchar_t kWriteJsonFile[] = L"systeminfo::DataCollectorImpl::WriteJsonFile";
+constexpr wchar_t kOutputFolderKey[] = L"output_folder";
+
+void WarnOfUnknownKeys(const Json::Value& document) {
+  std::vector<std::string> keys;
+  for (const CollectorRow& row : CollectorTable())
+    keys.push_back(ToUtf8(row.key));
+  const std::vector<UnknownKey> unknown = FindUnknownKeys(document, keys);
+
+  constexpr size_t kMostWarnings = 20;  // a file of something else altogether is full of them
+  const size_t count = std::min(unknown.size(), kMostWarnings);
+  for (size_t i = 0; i < count; ++i) {
+    const std::wstring hint =
+        unknown[i].nearest.empty() ? std::wstring() : L"; nearest is " + ToWide(unknown[i].nearest);
+    LOG_WARNING(kBuildCollectors, L"The settings key %s names no collector%s", ToWide(unknown[i].key).c_str(),
+                hint.c_str());
+  }
+  if (unknown.size() > count) {
+    LOG_WARNING(kBuildCollectors, L"%u more settings keys name no collector",
+                static_cast<unsigned>(unknown.size() - count));
+  }
+}
+
+std::wstring QuotedNames(const CollectorList& collectors) {
+  std::wstring names;
+  for (const PlannedCollector& planned : collectors) {
+    if (!names.empty()) names += L", ";
+    names += L"'" + planned.collector->GetName() + L"'";
+  }
+  return names;
+}
+
+// Everything about one run that does not change from collector to collector.
+struct RunContext {
+  std::shared_ptr<CollectingSettings> settings;
+  std::shared_ptr<WMIWrapper> wmi;
+  const std::atomic<bool>* cancel;
+  std::wstring outputFolder;
+  bool pretty;
+};
+
+void StartAndWrite(ICollector& collector, const RunContext& context, CollectorOutcome& outcome) {
+  collector.Start(context.settings, context.wmi, context.cancel);
+  const Json::Value& data = collector.Data();
+  if (data.isNull()) {
+    LOG_TRACE(kRunCollectors, L"No data collected for %s", outcome.name.c_str());
+    return;
+  }
+  outcome.records = CountRecords(data);
+  const std::wstring path = std::wstring(JoinPath(context.outputFolder, outcome.name)) + L".json";
+  const DWORD error = DataCollectorImpl::WriteJsonFile(path, data, context.pretty, outcome.bytes);
+  outcome.outcome = error == ERROR_SUCCESS ? Outcome::kData : Outcome::kNotWritten;
+  if (error != ERROR_SUCCESS) outcome.reason = Format(L"error %u", error);
+}
+
+void SetFailed(CollectorOutcome& outcome, std::wstring reason) {
+  outcome.outcome = Outcome::kFailed;
+  outcome.reason = std::move(reason);
+  outcome.records = 0;
+  LOG_ERROR(kRunCollectors, L"The collector of %s failed: %s", outcome.name.c_str(), outcome.reason.c_str());
+  LOG_TRACE(kRunCollectors, L"No data collected for %s", outcome.name.c_str());
+}
+
+// The boundary that no exception of a collector passes.
+CollectorOutcome RunOne(const PlannedCollector& planned, const RunContext& context) {
+  CollectorOutcome outcome;
+  outcome.name = planned.collector->GetName();
+  outcome.className = planned.className;
+  const auto start = std::chrono::steady_clock::now();
+  try {
+    StartAndWrite(*planned.collector, context, outcome);
+  } catch (const std::exception& exception) {
+    SetFailed(outcome, ToWide(exception.what()));
+  } catch (...) {
+    SetFailed(outcome, L"an exception of unknown type");
+  }
+  const auto elapsed = std::chrono::steady_clock::now() - start;
+  outcome.milliseconds = static_cast<uint64_t>(std::chrono::duration_cast<std::chrono::milliseconds>(elapsed).count());
+  return outcome;
+}
+
+}  // namespace
+
+DataCollectorImpl::DataCollectorImpl(std::shared_ptr<CollectingSettings> settings) : m_settings(std::move(settings)) {}
+
+int DataCollectorImpl::CollectAll(const std::atomic<bool>* cancel, const ProgressCallback& progress) {
+  return RunCollectors(cancel, progress, BuildCollectors());
+}
+
+CollectorList DataCollectorImpl::BuildCollectors() const {
+  WarnOfUnknownKeys(m_settings->Document());
+  CollectorList collectors;
+  for (const CollectorRow& row : CollectorTable()) {
+    if (IsCollectorEnabled(row.key)) collectors.push_back({row.make(row.key), row.className});
+  }
+  return collectors;
+}
+
+bool DataCollectorImpl::IsCollectorEnabled(std::wstring_view key) const {
+  return systeminfo::IsCollectorEnabled(m_settings->Document(), ToUtf8(key));
+}
+
+std::wstring DataCollectorImpl::GetOutputFolder() const {
+  std::wstring folder;
+  switch (m_settings->GetOutputFolderValue(folder)) {
+    case OutputFolderStatus::kFound:
+      break;
+    case OutputFolderStatus::kAbsent:
+      LOG_ERROR(kGetOutputFolder, L"%s not set", kOutputFolderKey);
+      break;
+    case OutputFolderStatus::kNotString:
+      LOG_ERROR(kGetOutputFolder, L"%s does not have string type", kOutputFolderKey);
+      break;
+  }
+  return folder;
+}
+
+bool DataCollectorImpl::CreateOutputFolder() const {
+  const std::wstring folder = GetOutputFolder();
+  if (folder.empty()) return false;
+  if (PathExists(folder)) {
+    LOG_ERROR(kCreateOutputFolder, L"%s already exists. doing nothing", kOutputFolderKey);
+    return false;
+  }
+  // Somebody who made the folder since the test above is as good as ourselves.
+  const DWORD error = CreatePrivateFolder(folder);
+  if (error == ERROR_SUCCESS || error == ERROR_ALREADY_EXISTS) return true;
+  LOG_ERROR(kCreateOutputFolder, L"failed to create output folder %s", folder.c_str());
+  LOG_ERROR(kCreateOutputFolder, L"error %u", error);
+  return false;
+}
+
+int DataCollectorImpl::RunCollectors(const std::atomic<bool>* cancel, const ProgressCallback& progress,
+                                     const CollectorList& collectors) {
+  m_outcomes.clear();
+  m_settings->Print();
+  LOG_TRACE(kRunCollectors, L"Collecting data for : [%s]", QuotedNames(collectors).c_str());
+  if (!CreateOutputFolder()) return kRunNoOutputFolder;
+  const RunContext context{m_settings, std::make_shared<WMIWrapper>(), cancel, GetOutputFolder(),
+                           m_settings->GetPrettyPrint()};
+  if (context.wmi->Init() != 0) {
+    LOG_ERROR(kRunCollectors, L"wmiwrapper init failed; will not continue");
+    return kRunNoWmi;
+  }
+
+  logging::ErrorCapture errors;
+  const int total = static_cast<int>(collectors.size());
+  int current = 1;
+  for (const PlannedCollector& planned : collectors) {
+    if (IsCancelled(cancel)) {
+      LOG_TRACE(kRunCollectors, L"cancel, early exit");
+      return kRunCancelled;
+    }
+    LOG_TRACE(kRunCollectors, L"Collecting data for %s ...", planned.collector->GetName().c_str());
+    CollectorOutcome& outcome = m_outcomes.emplace_back(RunOne(planned, context));
+    outcome.errors = errors.Take();
+    if (progress) progress(current, total);
+    ++current;
+  }
+  return IsCancelled(cancel) ? kRunCancelled : kRunDone;
+}
+
+unsigned long DataCollectorImpl::WriteJsonFile(std::wstring_view path, const Json::Value& value, bool pretty,
+                                               uint64_t& bytes) {
+  const std::string text = pretty ? WriteStyledJson(value) : WriteCompactJson(value);
+  const DWORD error = WriteWholeFile(path, std::string_view(text));
+  if (error != ERROR_SUCCESS) {
+    LOG_ERROR(kWriteJsonFile, L"Failed to write %s, error %u", std::wstring(path).c_str(), error);
+  } else {
+    bytes = text.size();
+  }
+  return error;
+}
+
+}  // namespace systeminfo

@@ -1,0 +1,139 @@
+#include "systeminfo/wmi_wrapper.h"
+
+#include <utility>
+
+#include "core/logging.h"
+#include "systeminfo/variant_to_json.h"
+
+namespace {
+
+constexpr wchar_t kInit[] = L"WMIWrapper::Init";
+constexpr wchar_t kExecuteQuery[] = L"WMIWrapper::ExecuteQuery";
+
+// Logs a failed step of Init; `format` takes the status.
+bool Succeeded(HRESULT status, const wchar_t* format) {
+  if (FAILED(status)) LOG_ERROR(kInit, format, static_cast<unsigned>(status));
+  return SUCCEEDED(status);
+}
+
+// Calls store(name, value) for each property that can be read, and failed(name, status) for each that cannot.
+template <class Store, class Failed>
+void ReadProperties(IWbemClassObject& instance, const WMIWrapper::Names& names, Store store, Failed failed) {
+  for (const std::wstring& name : names) {
+    ScopedVariant variant;
+    const HRESULT status = instance.Get(name.c_str(), 0, variant.Receive(), nullptr, nullptr);
+    if (FAILED(status)) {
+      failed(name, status);
+    } else {
+      store(name, VariantToJsonValue(variant.Get()));
+    }
+  }
+}
+
+void ReadRow(IWbemClassObject& instance, const WMIWrapper::Names& names, WMIWrapper::Row& row) {
+  ReadProperties(
+      instance, names, [&row](const std::wstring& name, Json::Value value) { row[name] = std::move(value); },
+      [](const std::wstring&, HRESULT status) {
+        LOG_ERROR(kExecuteQuery, L"IWbemClassObject->Get failed with message %s", WbemErrorName(status));
+      });
+}
+
+}  // namespace
+
+WMIWrapper::~WMIWrapper() {
+  m_services.Reset();
+  m_locator.Reset();
+  CoUninitialize();
+}
+
+int WMIWrapper::Init() {
+  if (!Succeeded(CoInitializeEx(nullptr, COINIT_MULTITHREADED), L"Failed to initialize COM library. Error code = %x")) {
+    return 1;
+  }
+  if (!Succeeded(CoInitializeSecurity(nullptr, -1, nullptr, nullptr, RPC_C_AUTHN_LEVEL_DEFAULT,
+                                      RPC_C_IMP_LEVEL_IMPERSONATE, nullptr, EOAC_NONE, nullptr),
+                 L"Failed to initialize security. Error code = %x")) {
+    return 1;
+  }
+  if (!Succeeded(
+          CoCreateInstance(CLSID_WbemLocator, nullptr, CLSCTX_INPROC_SERVER, IID_IWbemLocator, m_locator.ReceiveVoid()),
+          L"Failed to create IWbemLocator object. Err code = %x")) {
+    return 1;
+  }
+  const ScopedBstr space = MakeBstr(L"ROOT\\CIMV2");
+  if (!Succeeded(
+          m_locator->ConnectServer(space.Get(), nullptr, nullptr, nullptr, 0, nullptr, nullptr, m_services.Receive()),
+          L"Coult not connect to server. Error code = %x")) {
+    return 1;
+  }
+  if (!Succeeded(CoSetProxyBlanket(m_services.Get(), RPC_C_AUTHN_WINNT, RPC_C_AUTHZ_NONE, nullptr,
+                                   RPC_C_AUTHN_LEVEL_CALL, RPC_C_IMP_LEVEL_IMPERSONATE, nullptr, EOAC_NONE),
+                 L"Could not set proxy blanket. Error code = %x")) {
+    return 1;
+  }
+  return 0;
+}
+
+int WMIWrapper::VisitInstances(const std::wstring& query, bool onlyFirst, const InstanceVisitor& visit) {
+  if (!m_services) {
+    LOG_ERROR(kExecuteQuery, L"Invalid pSvc pointer; query %s", query.c_str());
+    return 1;
+  }
+  const ScopedBstr language = MakeBstr(L"WQL");
+  const ScopedBstr text = MakeBstr(query);
+  ComPtr<IEnumWbemClassObject> instances;
+  HRESULT status = m_services->ExecQuery(
+      language.Get(), text.Get(), WBEM_FLAG_FORWARD_ONLY | WBEM_FLAG_RETURN_IMMEDIATELY, nullptr, instances.Receive());
+  while (SUCCEEDED(status) && instances) {
+    ComPtr<IWbemClassObject> instance;
+    ULONG returned = 0;
+    status = instances->Next(WBEM_INFINITE, 1, instance.Receive(), &returned);
+    if (FAILED(status) || returned == 0 || !instance) break;
+    visit(*instance.Get());
+    if (onlyFirst) break;
+  }
+  // ExecQuery returns at once, so a query that WMI cannot run at all may fail only in Next.
+  if (FAILED(status)) {
+    LOG_ERROR(kExecuteQuery, L"Query %s failed. Error code %x", query.c_str(), static_cast<unsigned>(status));
+    return 1;
+  }
+  return 0;
+}
+
+int WMIWrapper::ExecuteQuery(const std::wstring& query, const Names& names, Row& row) {
+  return VisitInstances(query, true, [&](IWbemClassObject& instance) { ReadRow(instance, names, row); });
+}
+
+int WMIWrapper::ExecuteQuery(const std::wstring& query, const Names& names, Rows& rows) {
+  return VisitInstances(query, false,
+                        [&](IWbemClassObject& instance) { ReadRow(instance, names, rows.emplace_back()); });
+}
+
+int WMIWrapper::ExecuteQuery(const std::wstring& query, const Names& names, Table& table) {
+  return VisitInstances(query, false, [&](IWbemClassObject& instance) {
+    std::vector<Json::Value>& row = table.emplace_back();
+    ReadProperties(
+        instance, names, [&row](const std::wstring&, Json::Value value) { row.push_back(std::move(value)); },
+        [](const std::wstring& name, HRESULT status) {
+          LOG_ERROR(kExecuteQuery, L"IWbemClassObject->Get(%s) failed with message %s", name.c_str(),
+                    WbemErrorName(status));
+        });
+  });
+}
+
+const wchar_t* WbemErrorName(HRESULT code) {
+  switch (static_cast<unsigned>(code)) {
+    case 0:
+      return L"WBEM_S_NO_ERROR";
+    case 0x80041001:
+      return L"WBEM_E_FAILED";
+    case 0x80041002:
+      return L"WBEM_E_NOT_FOUND";
+    case 0x80041006:
+      return L"WBEM_E_OUT_OF_MEMORY";
+    case 0x80041008:
+      return L"WBEM_E_INVALID_PARAMETER";
+    default:
+      return L"Invalid return code";
+  }
+}

@@ -1,0 +1,56 @@
+// The one gateway of the collectors to Windows Management Instrumentation: one connection to the local ROOT\CIMV2 for a
+// collection run, and WQL queries whose properties come back as JSON values (variant_to_json.h says how). Made, used
+// and destroyed on one thread; no collector may keep it beyond the run. Failures are logged here and returned as
+// values.
+#pragma once
+
+#include <windows.h>
+
+#include <json/value.h>
+#include <wbemidl.h>
+
+#include <functional>
+#include <map>
+#include <string>
+#include <vector>
+
+#include "core/com.h"
+
+class WMIWrapper {
+ public:
+  using Names = std::vector<std::wstring>;          // of the wanted properties
+  using Row = std::map<std::wstring, Json::Value>;  // by property name; operator[] of a missing name is JSON null
+  using Rows = std::vector<Row>;
+  using Table = std::vector<std::vector<Json::Value>>;  // values in the order of the names
+
+  WMIWrapper() = default;
+
+  // Queries go to `services`, and Init is not called.
+  explicit WMIWrapper(ComPtr<IWbemServices> services) : m_services(std::move(services)) {}
+
+  // Leaves COM once, whether Init was called and succeeded or not.
+  ~WMIWrapper();
+  WMIWrapper(const WMIWrapper&) = delete;
+  WMIWrapper& operator=(const WMIWrapper&) = delete;
+
+  // Enters the multithreaded apartment, sets the security of the process and connects. 0 on success, 1 on failure, also
+  // when the process had set its security before.
+  int Init();
+
+  // The three forms return 0 on success, also when nothing matched, and 1 when the query failed. A failure on the way
+  // keeps the rows that came before it. A property that cannot be read is left out of its row, so a row of a table may
+  // be shorter than `names`.
+  int ExecuteQuery(const std::wstring& query, const Names& names, Row& row);      // the first instance only
+  int ExecuteQuery(const std::wstring& query, const Names& names, Rows& rows);    // appends one row for each instance
+  int ExecuteQuery(const std::wstring& query, const Names& names, Table& table);  // likewise
+
+ private:
+  using InstanceVisitor = std::function<void(IWbemClassObject& instance)>;
+  int VisitInstances(const std::wstring& query, bool onlyFirst, const InstanceVisitor& visit);
+
+  ComPtr<IWbemLocator> m_locator;
+  ComPtr<IWbemServices> m_services;
+};
+
+// The name of a WMI status code for log lines; "Invalid return code" for one that is not known.
+const wchar_t* WbemErrorName(HRESULT code);

@@ -1,0 +1,161 @@
+#include "systeminfo/wmi_wrapper.h"
+
+#include <gmock/gmock.h>
+
+#include <thread>
+
+#include "core/logging.h"
+#include "tests/support/fake_wmi.h"
+
+namespace {
+
+using fake_wmi::Failure;
+using fake_wmi::Number;
+using fake_wmi::Text;
+using testing::ElementsAre;
+using testing::IsEmpty;
+
+const WMIWrapper::Names kNames = {L"Name", L"Size"};
+
+class WmiQuery : public testing::Test {
+ protected:
+  FakeWmi m_fake;
+  WMIWrapper m_wmi{m_fake.Services()};
+  logging::ErrorCapture m_errors;
+  fake_wmi::Answer& m_answer = m_fake.answers[L"Q"];
+};
+
+TEST_F(WmiQuery, EachFormKeepsWhatWasThereAndAddsItsRows) {
+  m_answer.instances = {{{L"Name", Text(L"a")}, {L"Size", Number(1)}, {L"Unwanted", Number(9)}},
+                        {{L"Name", Text(L"b")}, {L"Size", Number(2)}}};
+  WMIWrapper::Row row = {{L"Before", 7}};
+  EXPECT_EQ(m_wmi.ExecuteQuery(L"Q", kNames, row), 0);
+  EXPECT_EQ(row, (WMIWrapper::Row{{L"Before", 7}, {L"Name", "a"}, {L"Size", 1u}}));
+  EXPECT_EQ(m_fake.nextCalls, 1) << "the single-row form asks for one instance only";
+
+  WMIWrapper::Rows rows(1);
+  EXPECT_EQ(m_wmi.ExecuteQuery(L"Q", kNames, rows), 0);
+  EXPECT_THAT(rows, ElementsAre(WMIWrapper::Row{}, WMIWrapper::Row{{L"Name", "a"}, {L"Size", 1u}},
+                                WMIWrapper::Row{{L"Name", "b"}, {L"Size", 2u}}));
+
+  WMIWrapper::Table table(1);
+  EXPECT_EQ(m_wmi.ExecuteQuery(L"Q", kNames, table), 0);
+  EXPECT_THAT(table, ElementsAre(IsEmpty(), ElementsAre("a", 1u), ElementsAre("b", 2u)));
+  EXPECT_THAT(m_errors.Take(), IsEmpty());
+}
+
+TEST_F(WmiQuery, NothingFoundIsSuccessWithoutRows) {
+  for (const bool hasEnumerator : {true, false}) {
+    m_answer.hasEnumerator = hasEnumerator;
+    WMIWrapper::Row row;
+    WMIWrapper::Rows rows;
+    WMIWrapper::Table table;
+    EXPECT_EQ(m_wmi.ExecuteQuery(L"Q", kNames, row), 0);
+    EXPECT_EQ(m_wmi.ExecuteQuery(L"Q", kNames, rows), 0);
+    EXPECT_EQ(m_wmi.ExecuteQuery(L"Q", kNames, table), 0);
+    EXPECT_TRUE(row.empty() && rows.empty() && table.empty());
+  }
+  EXPECT_THAT(m_errors.Take(), IsEmpty());
+}
+
+TEST_F(WmiQuery, PropertyThatCannotBeReadIsLoggedAndLeftOut) {
+  m_answer.instances = {{{L"Size", Number(1)}}, {{L"Name", Text(L"b")}, {L"Size", Failure(WBEM_E_FAILED)}}};
+  WMIWrapper::Rows rows;
+  EXPECT_EQ(m_wmi.ExecuteQuery(L"Q", kNames, rows), 0);
+  EXPECT_THAT(rows, ElementsAre(WMIWrapper::Row{{L"Size", 1u}}, WMIWrapper::Row{{L"Name", "b"}}));
+  EXPECT_THAT(m_errors.Take(),
+              ElementsAre(L"WMIWrapper::ExecuteQuery: IWbemClassObject->Get failed with message WBEM_E_NOT_FOUND",
+                          L"WMIWrapper::ExecuteQuery: IWbemClassObject->Get failed with message WBEM_E_FAILED"));
+
+  WMIWrapper::Table table;
+  EXPECT_EQ(m_wmi.ExecuteQuery(L"Q", kNames, table), 0);
+  EXPECT_THAT(table, ElementsAre(ElementsAre(1u), ElementsAre("b")));
+  EXPECT_THAT(m_errors.Take(),
+              ElementsAre(L"WMIWrapper::ExecuteQuery: IWbemClassObject->Get(Name) failed with message WBEM_E_NOT_FOUND",
+                          L"WMIWrapper::ExecuteQuery: IWbemClassObject->Get(Size) failed with message WBEM_E_FAILED"));
+}
+
+TEST_F(WmiQuery, FailureIsLoggedAndKeepsTheRowsBeforeIt) {
+  WMIWrapper::Table table;
+  m_answer.queryStatus = WBEM_E_INVALID_QUERY;
+  EXPECT_EQ(m_wmi.ExecuteQuery(L"Q", kNames, table), 1);
+  EXPECT_THAT(m_errors.Take(), ElementsAre(L"WMIWrapper::ExecuteQuery: Query Q failed. Error code 80041017"));
+
+  m_answer.queryStatus = WBEM_S_NO_ERROR;
+  m_answer.endStatus = WBEM_E_INVALID_CLASS;
+  m_answer.instances = {{{L"Name", Text(L"a")}, {L"Size", Number(1)}}};
+  EXPECT_EQ(m_wmi.ExecuteQuery(L"Q", kNames, table), 1);
+  EXPECT_THAT(m_errors.Take(), ElementsAre(L"WMIWrapper::ExecuteQuery: Query Q failed. Error code 80041010"));
+  EXPECT_THAT(table, ElementsAre(ElementsAre("a", 1u)));
+}
+
+TEST(WMIWrapper, QueryWithoutConnectionFails) {
+  logging::ErrorCapture errors;
+  WMIWrapper wmi;
+  WMIWrapper::Row row;
+  EXPECT_EQ(wmi.ExecuteQuery(L"SELECT 1", kNames, row), 1);
+  EXPECT_THAT(errors.Take(), ElementsAre(L"WMIWrapper::ExecuteQuery: Invalid pSvc pointer; query SELECT 1"));
+}
+
+TEST(WMIWrapper, ThreadThatIsInAnotherApartmentCannotConnect) {
+  logging::ErrorCapture errors;
+  std::thread([] {
+    ASSERT_EQ(CoInitializeEx(nullptr, COINIT_APARTMENTTHREADED), S_OK);
+    WMIWrapper wmi;
+    EXPECT_EQ(wmi.Init(), 1);
+  }).join();
+  EXPECT_THAT(errors.Take(), ElementsAre(L"WMIWrapper::Init: Failed to initialize COM library. Error code = 80010106"));
+}
+
+TEST(WMIWrapper, LiveQueriesReturnTheMachinesOwnData) {
+  std::thread([] {
+    logging::ErrorCapture errors;
+    {
+      WMIWrapper wmi;
+      ASSERT_EQ(wmi.Init(), 0);
+      WMIWrapper::Row system;
+      EXPECT_EQ(wmi.ExecuteQuery(L"SELECT * FROM Win32_ComputerSystem", {L"Name"}, system), 0);
+      wchar_t name[MAX_COMPUTERNAME_LENGTH + 1] = {};
+      DWORD size = MAX_COMPUTERNAME_LENGTH + 1;
+      ASSERT_TRUE(GetComputerNameW(name, &size));
+      EXPECT_STRCASEEQ(system[L"Name"].asCString(), std::string(name, name + size).c_str());
+
+      const std::wstring own = std::to_wstring(GetCurrentProcessId());
+      WMIWrapper::Table processes;
+      EXPECT_EQ(wmi.ExecuteQuery(L"SELECT * FROM Win32_Process WHERE ProcessId = " + own, {L"ProcessId", L"Caption"},
+                                 processes),
+                0);
+      EXPECT_THAT(processes, ElementsAre(ElementsAre(Json::UInt(GetCurrentProcessId()), "systeminfo_test.exe")));
+      EXPECT_THAT(errors.Take(), IsEmpty());
+
+      WMIWrapper::Rows rows;
+      EXPECT_EQ(wmi.ExecuteQuery(L"SELECT * FROM Win32_ComputerSystem", {L"NoSuchProperty"}, rows), 0);
+      EXPECT_THAT(rows, ElementsAre(IsEmpty()));
+      EXPECT_THAT(errors.Take(), ElementsAre(L"WMIWrapper::ExecuteQuery: IWbemClassObject->Get failed with message "
+                                             L"WBEM_E_NOT_FOUND"));
+      EXPECT_EQ(wmi.ExecuteQuery(L"this is no query", {L"Name"}, rows), 1);
+    }
+    APTTYPE type{};
+    APTTYPEQUALIFIER qualifier{};
+    EXPECT_EQ(CoGetApartmentType(&type, &qualifier), CO_E_NOTINITIALIZED) << "COM is left with the wrapper";
+  }).join();
+}
+
+TEST(WbemErrorName, KnownAndUnknownCodes) {
+  struct {
+    unsigned code;
+    const wchar_t* name;
+  } const rows[] = {
+      {0, L"WBEM_S_NO_ERROR"},
+      {0x80041001, L"WBEM_E_FAILED"},
+      {0x80041002, L"WBEM_E_NOT_FOUND"},
+      {0x80041006, L"WBEM_E_OUT_OF_MEMORY"},
+      {0x80041008, L"WBEM_E_INVALID_PARAMETER"},
+      {0x80041003, L"Invalid return code"},
+      {1, L"Invalid return code"},
+  };
+  for (const auto& row : rows)
+    EXPECT_STREQ(WbemErrorName(static_cast<HRESULT>(row.code)), row.name) << row.code;
+}
+
+}  // namespace

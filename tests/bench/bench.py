@@ -1,0 +1,238 @@
+#!/usr/bin/env python3
+"""Measures the program against native peers: same files, same run, rounds in turn, medians.
+
+usage: bench.py [--list] [--rounds N] [--programs FOLDER] [ROW...]
+
+Ours runs under Wine, the peer natively; both are whole processes on the wall clock. The ratio is the median of the
+rounds' own ratios; below 1 ours is faster (or smaller). Speed is reported, never asserted: the exit status is 1 only when
+something failed to run or made a wrong result.
+
+A row is a function that takes a Bench and yields Lines, and one line in ROWS.
+"""
+import argparse
+import difflib
+import os
+import re
+import shutil
+import statistics
+import subprocess
+import sys
+import time
+from typing import NamedTuple
+
+import make_corpus
+
+ROOT = os.path.dirname(os.path.dirname(os.path.dirname(os.path.abspath(__file__))))
+FOLDER = f"{ROOT}/build/bench"
+SESSION = f"{ROOT}/tools/wine_session.sh"
+MIB = 1 << 20
+KEY_PART = 8 + 140  # what a package has before the encrypted archive, for a key of 1024 bits
+
+
+class Line(NamedTuple):
+    name: str
+    ours: str
+    peer: str
+    ratio: float | None  # None where the goal is about `value`
+    goal: float
+    value: float | None = None  # what the goal bounds, when that is not the ratio
+
+    def print(self):
+        value = self.ratio if self.value is None else self.value
+        ratio = "-" if self.ratio is None else f"{self.ratio:.2f}"
+        verdict = "reached" if value <= self.goal else "MISSED"
+        print(f"{self.name:24} {self.ours:>11} {self.peer:>11} {ratio:>6} {self.goal:>6g}  {verdict}", flush=True)
+
+
+class Bench:
+    def __init__(self, programs, rounds):
+        self.programs = programs
+        self.rounds = rounds
+        self.wine = wine_environment()
+        self._corpora = None
+
+    def corpus(self, name):
+        if self._corpora is None:
+            self._corpora = make_corpus.make_corpus(FOLDER)
+        return self._corpora[name]
+
+    def ours(self, program, *arguments):
+        """The command line of a program of the build; to be run with `wine=True`."""
+        path = f"{self.programs}/{program}.exe"
+        if not os.path.exists(path):
+            raise RuntimeError(f"{path} is not built")
+        return ["wine", path, *arguments]
+
+    def run(self, command, wine=False):
+        """Seconds on the wall clock of one run."""
+        begin = time.perf_counter()
+        subprocess.run(command, cwd=FOLDER, env=self.wine if wine else None, stdin=subprocess.DEVNULL,
+                       stdout=subprocess.DEVNULL, check=True)
+        return time.perf_counter() - begin
+
+    def output(self, command):
+        """What one of our programs prints."""
+        return subprocess.run(command, cwd=FOLDER, env=self.wine, stdin=subprocess.DEVNULL, check=True, text=True,
+                              stdout=subprocess.PIPE).stdout
+
+    def compare(self, name, goal, ours, peer, before=lambda: None, after=lambda: None, peer_in_wine=False):
+        """A line about the time of two commands. `before` and `after` are called around each run, outside the clock."""
+        def timed(side):
+            before()
+            seconds = self.run(*side)
+            after()
+            return seconds
+
+        sides = ((ours, True), (peer, peer_in_wine))
+        for side in sides:
+            timed(side)  # warm up: files into the cache, services of the session
+        pairs = []
+        for index in range(self.rounds):
+            if index % 2:
+                peer_seconds = timed(sides[1])
+                pairs.append((timed(sides[0]), peer_seconds))
+            else:
+                pairs.append((timed(sides[0]), timed(sides[1])))
+        ours_time, peer_time = (statistics.median(side) for side in zip(*pairs))
+        ratio = statistics.median(one / other for one, other in pairs)
+        return Line(name, f"{ours_time:.3f} s", f"{peer_time:.3f} s", ratio, goal)
+
+    def peak_over_idle(self, name, goal_mib, command, idle, before=lambda: None):
+        """A line about the memory of one of our commands over that of another one; both print their own peak."""
+        def peak(side):
+            before()
+            return int(re.search(r"peak_memory=(\d+)", self.output(side)).group(1))
+
+        rounds = [(peak(command), peak(idle)) for _ in range(3)]
+        over = max(one for one, _ in rounds) - min(other for _, other in rounds)
+        return Line(name, f"{over / MIB:.1f} MiB", "-", None, goal_mib, over / MIB)
+
+
+def wine_environment():
+    up = subprocess.run(["bash", "-c", f"source {SESSION} && st_wine_up && env -0"], check=True, text=True,
+                        stdin=subprocess.DEVNULL, stdout=subprocess.PIPE)
+    return dict(item.split("=", 1) for item in up.stdout.split("\0") if "=" in item)
+
+
+def remove(path):
+    if os.path.exists(path):
+        os.remove(path)
+
+
+# --- rows
+
+def pack(corpus, time_goal, size_goal):
+    def row(bench):
+        folder, ours, peer = bench.corpus(corpus), f"{FOLDER}/ours.zip", f"{FOLDER}/peer.zip"
+
+        def clear():
+            remove(ours), remove(peer)
+
+        def check():
+            if os.path.exists(ours):
+                subprocess.run([sys.executable, f"{ROOT}/tests/bench/verify_archive.py", ours, folder], check=True)
+                sizes["ours"] = os.path.getsize(ours)
+            else:
+                sizes["peer"] = os.path.getsize(peer)
+
+        sizes = {}
+        yield bench.compare(f"pack-{corpus}", time_goal, bench.ours("pack_bench", ours, corpus),
+                            ["zip", "-6", "-r", "-q", peer, corpus], clear, check)
+        clear()
+        yield Line("  archive size", f"{sizes['ours']} B", f"{sizes['peer']} B", sizes["ours"] / sizes["peer"], size_goal)
+    return row
+
+
+def pack_memory(bench):
+    archive = f"{FOLDER}/ours.zip"
+    idle = bench.ours("pack_bench", archive)
+    for corpus, goal in (("mixed", 24), ("small", 24), ("big", 40)):
+        bench.corpus(corpus)
+        yield bench.peak_over_idle(f"pack-memory {corpus}", goal, bench.ours("pack_bench", archive, corpus), idle)
+    remove(archive)
+
+
+def encrypt(bench):
+    archive, ours, peer = f"{bench.corpus('big')}/{os.listdir(bench.corpus('big'))[0]}", f"{FOLDER}/ours.bin", f"{FOLDER}/peer.bin"
+    size = os.path.getsize(archive)
+
+    def before():
+        remove(peer)
+        shutil.copyfile(archive, ours)
+
+    def after():
+        package = os.path.getsize(ours)
+        if package not in (size, size + KEY_PART):
+            raise RuntimeError(f"a package of {package} bytes for an archive of {size}")
+
+    # The peer's key is as long as the one that the provider uses, and as arbitrary.
+    openssl = ["openssl", "enc", "-rc4", "-provider", "legacy", "-provider", "default", "-K", "0123456789" + 22 * "0",
+               "-in", archive, "-out", peer]
+    yield bench.compare("encrypt", 1.15, bench.ours("encrypt_bench", ours), openssl, before, after)
+    yield bench.peak_over_idle("  peak memory", 2.2 * size / MIB, bench.ours("encrypt_bench", ours),
+                               bench.ours("pack_bench", f"{FOLDER}/ours.zip"), before)
+    for path in (ours, peer, f"{FOLDER}/ours.zip"):
+        remove(path)
+
+
+def walk(bench):
+    command = bench.ours("walk_bench", bench.corpus("small"))
+    figures = dict(re.findall(r"(walk_dir ms|bare ms|ratio)=([0-9.]+)", bench.output(command)))
+    yield Line("walk", f"{figures['walk_dir ms']} ms", f"{figures['bare ms']} ms", float(figures["ratio"]), 1.5)
+
+
+def start(bench):
+    # Without a job the program comes up, writes its first lines and ends: a little more than what the goal is about.
+    yield bench.compare("start", 4, bench.ours("support_tool", "nogui"), bench.ours("empty_program"), peer_in_wine=True)
+
+
+ROWS = {
+    "pack-mixed": ("50 MiB in 400 mixed files, against zip -6", pack("mixed", 0.60, 1.02)),
+    "pack-small": ("38 MiB in 10,000 files, against zip -6", pack("small", 0.90, 1.02)),
+    "pack-big": ("one file of 50 MiB, against zip -6", pack("big", 0.75, 1.01)),
+    "pack-memory": ("peak memory of packing over an idle run", pack_memory),
+    "encrypt": ("RC4 of 50 MiB, file to file, against openssl enc -rc4; its peak memory", encrypt),
+    "walk": ("10,000 files, against a bare FindFirstFile loop", walk),
+    "start": ("start, first log lines, end; against an empty GUI program", start),
+}
+
+
+def run_rows(bench, names):
+    print(f"{'row':24} {'ours':>11} {'peer':>11} {'ratio':>6} {'goal':>6}  verdict")
+    failed = False
+    for name in names:
+        try:
+            for line in ROWS[name][1](bench):
+                line.print()
+        except (OSError, RuntimeError, subprocess.SubprocessError) as error:
+            print(f"{name:24} FAILED: {error}", flush=True)
+            failed = True
+    return failed
+
+
+def main():
+    parser = argparse.ArgumentParser(description=__doc__, formatter_class=argparse.RawDescriptionHelpFormatter)
+    parser.add_argument("rows", nargs="*", metavar="ROW")
+    parser.add_argument("--list", action="store_true", help="name the rows")
+    parser.add_argument("--rounds", type=int, default=7)
+    parser.add_argument("--programs", default=f"{ROOT}/build/windows-cross/bin", help="where the programs of the build are")
+    options = parser.parse_args()
+    if options.list:
+        for name, (meaning, _) in ROWS.items():
+            print(f"{name:14} {meaning}")
+        return 0
+    for name in options.rows:
+        if name not in ROWS:
+            nearest = difflib.get_close_matches(name, ROWS, 1, 0)[0]
+            parser.error(f"there is no row {name}; is {nearest} meant?")
+    os.makedirs(FOLDER, exist_ok=True)
+    was_up = subprocess.run(["bash", "-c", f"source {SESSION} && wineserver -k0"], stderr=subprocess.DEVNULL).returncode == 0
+    try:
+        return int(run_rows(Bench(os.path.abspath(options.programs), max(1, options.rounds)), options.rows or ROWS))
+    finally:
+        if not was_up:
+            subprocess.run([SESSION, "down"], check=False)
+
+
+if __name__ == "__main__":
+    sys.exit(main())
