@@ -1,6 +1,7 @@
 #include "app/crash_handler.h"
 
 #include "core/logging.h"
+#include "core/runtime_failures.h"
 #include "core/scope_trace.h"
 #include "interfaces/crash_handler_api.h"
 
@@ -21,5 +22,6 @@ DynamicLibrary InitQxch() {
     LOG_ERROR(kScope, L"error initializing qxch %d", result);
     return {};
   }
+  InstallRuntimeFailureHooks();  // the library cannot reach this program's own run-time library
   return library;
 }
