@@ -1,11 +1,13 @@
 #!/usr/bin/env node
-// Receives packages over tus 1.0 (resumable HTTP uploads). README.md says how to run it; verified_store.js keeps the files.
+// Receives packages over tus 1.0 (resumable HTTP uploads). README.md says how to run it; verified_store.js keeps the
+// files.
 
 import {timingSafeEqual} from 'node:crypto'
 import fs from 'node:fs'
 import http from 'node:http'
 import https from 'node:https'
 import path from 'node:path'
+import {finished} from 'node:stream/promises'
 import {parseArgs} from 'node:util'
 
 import {Server} from '@tus/server'
@@ -16,6 +18,7 @@ const CATEGORY = 'kvsetuplogs'
 const ROUTE = '/files'
 const UPLOAD_ID = /^[0-9a-f]{32}$/ // what the tus server draws: 128 random bits
 const STALLED_CONNECTION = 120_000 // milliseconds without a byte
+const REFUSED_BODY = 30_000 // milliseconds that a sender gets to finish writing what is refused
 const CLEAN_UP_INTERVAL = 3_600_000 // milliseconds
 const PARENT_CHECK_INTERVAL = 500 // milliseconds
 
@@ -102,6 +105,16 @@ function sameSecret(given, expected) {
   return a.length === b.length && timingSafeEqual(a, b)
 }
 
+// The tus server closes the connection after a refusal. While the sender still writes, that would reset the connection
+// and the sender would never read why: so the body is first read and dropped. (One that the store gave up on halfway
+// cannot be.)
+async function dropBody(message) {
+  if (!message.readableDidRead) {
+    message.resume()
+    await finished(message, {writable: false, signal: AbortSignal.timeout(REFUSED_BODY)}).catch(() => {})
+  }
+}
+
 function makeTusServer(options, store) {
   return new Server({
     path: ROUTE,
@@ -132,7 +145,8 @@ function makeTusServer(options, store) {
       report(`received ${upload.id}: ${upload.size} bytes, ${JSON.stringify(upload.metadata.filename)}`)
       return {}
     },
-    onResponseError(request, failure) {
+    async onResponseError(request, failure) {
+      await dropBody(request.runtime.node.req)
       const {pathname} = new URL(request.url)
       if (!failure.status_code) {
         report(`failed ${request.method} ${pathname}:`, failure)
@@ -140,7 +154,7 @@ function makeTusServer(options, store) {
       }
       report(`refused ${request.method} ${pathname}: ${failure.status_code} ${failure.body.trim()}`)
       if (failure.status_code === 413) {
-        return refusal(413, `The upload is larger than it said, or larger than the ${options.maxSize} bytes accepted here.`)
+        return refusal(413, `The upload exceeds what it announced, or the ${options.maxSize} bytes accepted here.`)
       }
       return undefined
     },

@@ -1,6 +1,6 @@
-// The store behind the server: nobody sees an upload as complete before its bytes were hashed, found to be those that the
-// sender promised, and put on the disk with a receipt. That holds as well when the sender's connection breaks right after the
-// last byte, or when the server ends while it hashes: the next look at the upload does what was left to do.
+// The store behind the server: nobody sees an upload as complete before its bytes were hashed, found to be those that
+// the sender promised, and put on the disk with a receipt. That holds as well when the sender's connection breaks right
+// after the last byte, or when the server ends while it hashes: the next look at the upload does what was left to do.
 
 import {createHash} from 'node:crypto'
 import fs from 'node:fs/promises'
@@ -30,8 +30,8 @@ async function exists(file) {
 }
 
 export class VerifiedStore extends FileStore {
-  // Uploads lie in folder/uploads (the bytes as ID, the tus state as ID.json), receipts in folder/receipts (ID.json). Both
-  // folders exist already. One process at a time may use them.
+  // Uploads lie in folder/uploads (the bytes as ID, the tus state as ID.json), receipts in folder/receipts (ID.json).
+  // Both folders exist already. One process at a time may use them.
   constructor({folder, expirationPeriodInMilliseconds}) {
     super({directory: path.join(folder, 'uploads'), expirationPeriodInMilliseconds})
     this.extensions = this.extensions.filter((name) => name !== 'creation-defer-length')
@@ -48,8 +48,8 @@ export class VerifiedStore extends FileStore {
     return upload
   }
 
-  // Verifies a complete upload and writes its receipt, once however many ask. On a mismatch the upload is removed and every
-  // caller gets the refusal {status_code, body}.
+  // Verifies a complete upload and writes its receipt, once however many ask. On a mismatch the upload is removed and
+  // every caller gets the refusal {status_code, body}.
   settle(upload) {
     let work = this.settling.get(upload.id)
     if (!work) {
@@ -97,7 +97,8 @@ export class VerifiedStore extends FileStore {
     }
     if (sha256 !== metadata.sha256) {
       await this.remove(id)
-      throw {status_code: 422, body: `The ${size} bytes that arrived have another SHA-256 than was promised; they were removed.\n`}
+      const body = `The ${size} bytes that arrived have another SHA-256 than was promised; they were removed.\n`
+      throw {status_code: 422, body}
     }
     const receipt = {id, bytes: size, sha256, verified: true, received: new Date().toISOString(), metadata}
     await writeWhole(this.#receiptPath(id), `${JSON.stringify(receipt, null, 2)}\n`)
