@@ -74,14 +74,19 @@ DWORD LogFile::Open() {
   return m_openError;
 }
 
+// Whether the file of this slot, which gave `error`, belongs to another instance, or to somebody else altogether. It need not
+// be there any more: an instance that rotates moves it aside or deletes it at any moment.
+bool LogFile::IsTaken(DWORD error) const {
+  return error == ERROR_SHARING_VIOLATION || error == ERROR_ACCESS_DENIED || PathExists(Path(0));
+}
+
 DWORD LogFile::OpenAnySlot() {
   if (const DWORD error = CreateFolders(m_folder); error != ERROR_SUCCESS) return error;
   const unsigned first = m_slot;
   DWORD error = ERROR_SUCCESS;
   for (; m_slot <= kMostSlots; ++m_slot) {
     error = OpenSlot();
-    // A file that is there but is not to be had belongs to another instance, or to somebody else altogether.
-    if (error == ERROR_SUCCESS || !PathExists(Path(0))) break;
+    if (error == ERROR_SUCCESS || !IsTaken(error)) break;
   }
   if (error != ERROR_SUCCESS) m_slot = first;
   return error;

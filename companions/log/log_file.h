@@ -34,6 +34,7 @@ class LogFile {
   std::wstring Path(unsigned number) const;
   DWORD Open();
   DWORD OpenSlot();
+  bool IsTaken(DWORD error) const;
   DWORD OpenAnySlot();
   void Rotate();
   bool MoveAside();
