@@ -7,6 +7,7 @@
 #include <algorithm>
 
 #include "core/files.h"
+#include "core/paths.h"
 #include "core/program_path.h"
 #include "core/scoped.h"
 
@@ -18,20 +19,6 @@ constexpr std::wstring_view kNetworkPrefix = L"\\\\?\\UNC\\";
 bool EqualIgnoringCase(std::wstring_view a, std::wstring_view b) {
   return a.size() == b.size() && CompareStringOrdinal(a.data(), static_cast<int>(a.size()), b.data(),
                                                       static_cast<int>(b.size()), TRUE) == CSTR_EQUAL;
-}
-
-std::wstring_view WithoutEndSeparators(std::wstring_view path) {
-  while (path.ends_with(L'\\'))
-    path.remove_suffix(1);
-  return path;
-}
-
-// `inner` is `outer` or lies in it.
-bool Contains(std::wstring_view outer, std::wstring_view inner) {
-  outer = WithoutEndSeparators(outer);
-  inner = WithoutEndSeparators(inner);
-  if (inner.size() > outer.size() && inner[outer.size()] != L'\\') return false;
-  return EqualIgnoringCase(outer, inner.substr(0, outer.size()));
 }
 
 struct FolderPlace {
@@ -105,7 +92,8 @@ std::wstring OutputFolderRefusal(std::wstring_view folder, const std::vector<Pro
   const auto separators = static_cast<size_t>(std::count(path.begin(), path.end(), L'\\'));
   if (separators < place.rootParts) return L"it is the root of a drive or a network share";
   for (const ProtectedFolder& entry : protectedFolders) {
-    if (!entry.path.empty() && Contains(folder, entry.path)) return std::wstring(L"it is, or holds, ") + entry.what;
+    if (!entry.path.empty() && FolderContains(folder, entry.path))
+      return std::wstring(L"it is, or holds, ") + entry.what;
   }
   return {};
 }

@@ -101,6 +101,16 @@ std::wstring ExtendedPath(std::wstring_view path) {
   return ExtendPath(path, isAbsolute ? std::wstring() : CurrentDirectory());
 }
 
+std::wstring ShownPath(std::wstring_view extendedPath) {
+  if (extendedPath.starts_with(kNetworkPrefix)) {
+    return L"\\\\" + std::wstring(extendedPath.substr(kNetworkPrefix.size()));
+  }
+  constexpr size_t kDriveLength = 3;  // other names behind the prefix, such as volumes, mean nothing without it
+  const std::wstring_view rest = extendedPath.substr(std::min(kLocalPrefix.size(), extendedPath.size()));
+  const bool isOnDrive = extendedPath.starts_with(kLocalPrefix) && rest.size() >= kDriveLength && rest[1] == L':';
+  return std::wstring(isOnDrive ? rest : extendedPath);
+}
+
 bool PathExists(std::wstring_view path) {
   return GetFileAttributesW(ExtendedPath(path).c_str()) != INVALID_FILE_ATTRIBUTES;
 }
@@ -110,29 +120,39 @@ bool FolderExists(std::wstring_view path) {
   return attributes != INVALID_FILE_ATTRIBUTES && (attributes & FILE_ATTRIBUTE_DIRECTORY) != 0;
 }
 
-DWORD ReadWholeFile(std::wstring_view path, uint64_t limit, std::string& bytes) {
-  // All sharing: neither who writes a log nor who replaces a settings file by renaming is to be disturbed.
+KernelHandle OpenForReading(std::wstring_view path) {
   constexpr DWORD kShareAll = FILE_SHARE_READ | FILE_SHARE_WRITE | FILE_SHARE_DELETE;
-  const KernelHandle file(CreateFileW(ExtendedPath(path).c_str(), GENERIC_READ, kShareAll, nullptr, OPEN_EXISTING,
-                                      FILE_FLAG_SEQUENTIAL_SCAN, nullptr));
+  return KernelHandle(CreateFileW(ExtendedPath(path).c_str(), GENERIC_READ, kShareAll, nullptr, OPEN_EXISTING,
+                                  FILE_FLAG_SEQUENTIAL_SCAN, nullptr));
+}
+
+DWORD ReadBytes(HANDLE file, size_t count, std::string& bytes) {
+  bytes.resize(count);
+  size_t filled = 0;
+  while (filled < bytes.size()) {
+    constexpr size_t kChunk = size_t{16} << 20;
+    DWORD read = 0;
+    if (!ReadFile(file, bytes.data() + filled, static_cast<DWORD>(std::min(bytes.size() - filled, kChunk)), &read,
+                  nullptr)) {
+      const DWORD error = GetLastError();
+      bytes.resize(filled);
+      return error;
+    }
+    if (read == 0) break;
+    filled += read;
+  }
+  bytes.resize(filled);
+  return ERROR_SUCCESS;
+}
+
+DWORD ReadWholeFile(std::wstring_view path, uint64_t limit, std::string& bytes) {
+  const KernelHandle file = OpenForReading(path);
   if (!file) return GetLastError();
   LARGE_INTEGER size{};
   if (!GetFileSizeEx(file.Get(), &size)) return GetLastError();
   if (static_cast<uint64_t>(size.QuadPart) > limit) return ERROR_FILE_TOO_LARGE;
-  bytes.resize(static_cast<size_t>(size.QuadPart));
-  size_t filled = 0;
-  while (filled < bytes.size()) {  // a file that shrinks meanwhile ends early, one that grows is cut
-    constexpr size_t kChunk = size_t{16} << 20;
-    DWORD count = 0;
-    if (!ReadFile(file.Get(), bytes.data() + filled, static_cast<DWORD>(std::min(bytes.size() - filled, kChunk)),
-                  &count, nullptr)) {
-      return GetLastError();
-    }
-    if (count == 0) break;
-    filled += count;
-  }
-  bytes.resize(filled);
-  return ERROR_SUCCESS;
+  // A file that shrinks meanwhile ends early, one that grows is cut.
+  return ReadBytes(file.Get(), static_cast<size_t>(size.QuadPart), bytes);
 }
 
 DWORD WriteWholeFile(std::wstring_view path, std::string_view bytes) {

@@ -19,8 +19,19 @@ std::wstring ExtendedPath(std::wstring_view path);
 // The same without asking the system; `currentDirectory` is absolute.
 std::wstring ExtendPath(std::wstring_view path, std::wstring_view currentDirectory);
 
+// An extended path as people and other programs write it: without the prefix. Other paths stay as they are.
+std::wstring ShownPath(std::wstring_view extendedPath);
+
 bool PathExists(std::wstring_view path);    // a file or a folder
 bool FolderExists(std::wstring_view path);  // a folder
+
+// Opens an existing file for reading it from the beginning, and lets others do with it what they like meanwhile:
+// neither who writes a log nor who replaces a settings file by renaming is disturbed. Invalid, with GetLastError set,
+// on failure.
+KernelHandle OpenForReading(std::wstring_view path);
+
+// Replaces `bytes` by the next `count` bytes of the file, or as many as it has.
+DWORD ReadBytes(HANDLE file, size_t count, std::string& bytes);
 
 // Reads a whole file into `bytes`. ERROR_FILE_TOO_LARGE when it is longer than `limit`; nothing is read then.
 DWORD ReadWholeFile(std::wstring_view path, uint64_t limit, std::string& bytes);

@@ -69,6 +69,14 @@ TEST(ReadWholeFile, LimitIsInclusiveAndNothingIsReadBeyond) {
   EXPECT_EQ(Content(folder.MakeFile(L"empty")), "");
 }
 
+TEST(ShownPath, IsThePathWithoutThePrefix) {
+  EXPECT_EQ(ShownPath(L"\\\\?\\C:\\a"), L"C:\\a");
+  EXPECT_EQ(ShownPath(L"\\\\?\\UNC\\server\\share\\a"), L"\\\\server\\share\\a");
+  EXPECT_EQ(ShownPath(L"\\\\?\\Volume{1}\\a"), L"\\\\?\\Volume{1}\\a");
+  for (const wchar_t* other : {L"C:\\a", L"a", L"", L"\\\\server\\share", L"\\\\?"})
+    EXPECT_EQ(ShownPath(other), other);
+}
+
 TEST(WriteWholeFile, ReplacesTheFileAndLeavesNoPartialOne) {
   const TestFolder folder;
   const std::wstring path = folder.Path(L"file");

@@ -1,5 +1,7 @@
 #include "core/paths.h"
 
+#include <windows.h>
+
 #include <algorithm>
 
 namespace {
@@ -14,8 +16,12 @@ qx::PathString JoinPath(std::wstring_view base, std::wstring_view part) {
 }
 
 std::wstring_view LastPathComponent(std::wstring_view path) {
-  path = path.substr(0, path.find_last_not_of(kSeparators) + 1);
+  path = WithoutEndSeparators(path);
   return path.substr(path.find_last_of(kSeparators) + 1);
+}
+
+std::wstring_view WithoutEndSeparators(std::wstring_view path) {
+  return path.substr(0, path.find_last_not_of(kSeparators) + 1);
 }
 
 bool IsVolumeRoot(std::wstring_view extendedPath) {
@@ -23,7 +29,15 @@ bool IsVolumeRoot(std::wstring_view extendedPath) {
   constexpr std::wstring_view kLocalPrefix = L"\\\\?\\";
   const bool isNetwork = extendedPath.starts_with(kNetworkPrefix);
   extendedPath.remove_prefix(std::min((isNetwork ? kNetworkPrefix : kLocalPrefix).size(), extendedPath.size()));
-  extendedPath = extendedPath.substr(0, extendedPath.find_last_not_of(kSeparators) + 1);
+  extendedPath = WithoutEndSeparators(extendedPath);
   const auto separators = std::count(extendedPath.begin(), extendedPath.end(), L'\\');
   return separators <= (isNetwork ? 1 : 0);  // "server\share", "C:"
+}
+
+bool FolderContains(std::wstring_view outer, std::wstring_view inner) {
+  outer = WithoutEndSeparators(outer);
+  inner = WithoutEndSeparators(inner);
+  if (inner.size() < outer.size() || (inner.size() > outer.size() && inner[outer.size()] != L'\\')) return false;
+  const int length = static_cast<int>(outer.size());
+  return CompareStringOrdinal(outer.data(), length, inner.data(), length, TRUE) == CSTR_EQUAL;
 }

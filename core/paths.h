@@ -12,5 +12,12 @@ qx::PathString JoinPath(std::wstring_view base, std::wstring_view part);
 // The text behind the last separator; separators at the end are passed over. Empty for "" and "\". Points into `path`.
 std::wstring_view LastPathComponent(std::wstring_view path);
 
+// Points into `path`.
+std::wstring_view WithoutEndSeparators(std::wstring_view path);
+
 // For an ExtendedPath: the root of a drive, a volume or a network share, with or without separators at the end.
 bool IsVolumeRoot(std::wstring_view extendedPath);
+
+// `inner` is `outer` or lies in it, as the system compares names. Both absolute and in one form (both as ExtendedPath
+// gives them, say); separators at the end do not count.
+bool FolderContains(std::wstring_view outer, std::wstring_view inner);

@@ -63,3 +63,22 @@ TEST(IsVolumeRoot, KnowsDrivesVolumesAndShares) {
   for (const auto& row : rows)
     EXPECT_EQ(IsVolumeRoot(row.path), row.isRoot) << row.path;
 }
+
+TEST(FolderContains, IsTrueForTheFolderAndWhatLiesInIt) {
+  struct {
+    const wchar_t* outer;
+    const wchar_t* inner;
+    bool expected;
+  } const rows[] = {
+      {L"C:\\Logs", L"C:\\Logs", true},
+      {L"C:\\Logs", L"c:\\LOGS\\", true},
+      {L"C:\\Logs\\", L"C:\\Logs\\deep\\er", true},
+      {L"C:\\", L"C:\\Logs", true},
+      {L"C:\\Logs", L"C:\\Logs2", false},
+      {L"C:\\Logs", L"C:\\", false},
+      {L"C:\\Logs\\deep", L"C:\\Logs", false},
+      {L"D:\\Logs", L"C:\\Logs", false},
+  };
+  for (const auto& row : rows)
+    EXPECT_EQ(FolderContains(row.outer, row.inner), row.expected) << row.outer << " and " << row.inner;
+}
