@@ -2,6 +2,8 @@
 
 #include <tinyxml2.h>
 
+#include "core/paths.h"
+
 namespace logging {
 namespace {
 
@@ -13,12 +15,6 @@ std::string Trimmed(const char* text) {
   const size_t first = all.find_first_not_of(" \t\r\n");
   if (first == std::string_view::npos) return {};
   return std::string(all.substr(first, all.find_last_not_of(" \t\r\n") - first + 1));
-}
-
-bool IsAbsolute(std::wstring_view path) {
-  const auto isSeparator = [](wchar_t c) { return c == L'\\' || c == L'/'; };
-  if (path.size() >= 2 && isSeparator(path[0]) && isSeparator(path[1])) return true;  // \\server, \\?\ .
-  return path.size() >= 3 && path[1] == L':' && isSeparator(path[2]);
 }
 
 }  // namespace
@@ -33,7 +29,7 @@ std::string ConfiguredLogFolder(const tinyxml2::XMLElement& configuration) {
 }
 
 std::wstring ResolveLogFolder(std::wstring_view folder, std::wstring_view settingsFolder) {
-  if (IsAbsolute(folder)) return std::wstring(folder);
+  if (IsAbsolutePath(folder)) return std::wstring(folder);
   return std::wstring(settingsFolder) + L"\\" + std::wstring(folder);
 }
 

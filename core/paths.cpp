@@ -20,6 +20,12 @@ std::wstring_view LastPathComponent(std::wstring_view path) {
   return path.substr(path.find_last_of(kSeparators) + 1);
 }
 
+bool IsAbsolutePath(std::wstring_view path) {
+  const auto isSeparator = [](wchar_t c) { return c == L'\\' || c == L'/'; };
+  if (path.size() >= 2 && isSeparator(path[0]) && isSeparator(path[1])) return true;
+  return path.size() >= 3 && path[1] == L':' && isSeparator(path[2]);
+}
+
 std::wstring_view WithoutEndSeparators(std::wstring_view path) {
   return path.substr(0, path.find_last_not_of(kSeparators) + 1);
 }

@@ -12,6 +12,9 @@ qx::PathString JoinPath(std::wstring_view base, std::wstring_view part);
 // The text behind the last separator; separators at the end are passed over. Empty for "" and "\". Points into `path`.
 std::wstring_view LastPathComponent(std::wstring_view path);
 
+// Names its place without a current directory: "C:\x", or what begins with two separators. Not so "C:x" and "\x".
+bool IsAbsolutePath(std::wstring_view path);
+
 // Points into `path`.
 std::wstring_view WithoutEndSeparators(std::wstring_view path);
 

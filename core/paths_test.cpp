@@ -44,6 +44,13 @@ TEST(LastPathComponent, IsTheTextBehindTheLastSeparator) {
     EXPECT_EQ(LastPathComponent(row.path), row.expected) << row.path;
 }
 
+TEST(IsAbsolutePath, NeedsADriveWithItsRootOrAServer) {
+  for (const wchar_t* path : {L"C:\\", L"c:/x", L"\\\\server\\share", L"//server/share", L"\\\\?\\C:\\x"})
+    EXPECT_TRUE(IsAbsolutePath(path)) << path;
+  for (const wchar_t* path : {L"", L"x", L"C:", L"C:x", L"\\x", L".\\x", L"%x%\\y"})
+    EXPECT_FALSE(IsAbsolutePath(path)) << path;
+}
+
 TEST(IsVolumeRoot, KnowsDrivesVolumesAndShares) {
   struct {
     const wchar_t* path;
