@@ -1,6 +1,7 @@
 #include "systeminfo/collector_table.h"
 
 #include "systeminfo/installed_software_collector.h"
+#include "systeminfo/startup_programs_collector.h"
 #include "systeminfo/system_summary.h"
 
 namespace systeminfo {
@@ -14,6 +15,7 @@ std::shared_ptr<ICollector> Make(std::wstring name) {
 // The only list. A collector that writes the same file as an earlier one replaces it.
 constexpr CollectorRow kCollectors[] = {
     {L"system_summary", L"SystemSummary", &Make<SystemSummary>},
+    {L"startup_programs", L"StartupProgramsCollector", &Make<StartupProgramsCollector>},
     {L"installed_software", L"InstalledSoftwareCollector", &Make<InstalledSoftwareCollector>},
 };
 
