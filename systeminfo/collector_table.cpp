@@ -1,6 +1,7 @@
 #include "systeminfo/collector_table.h"
 
 #include "systeminfo/installed_software_collector.h"
+#include "systeminfo/product_information_collector.h"
 #include "systeminfo/startup_programs_collector.h"
 #include "systeminfo/system_summary.h"
 
@@ -17,6 +18,7 @@ constexpr CollectorRow kCollectors[] = {
     {L"system_summary", L"SystemSummary", &Make<SystemSummary>},
     {L"startup_programs", L"StartupProgramsCollector", &Make<StartupProgramsCollector>},
     {L"installed_software", L"InstalledSoftwareCollector", &Make<InstalledSoftwareCollector>},
+    {L"product_information", L"ProductInformationCollector", &Make<ProductInformationCollector>},
 };
 
 }  // namespace
