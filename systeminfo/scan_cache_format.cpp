@@ -1,43 +1,35 @@
 #include "systeminfo/scan_cache_format.h"
 
 #include <algorithm>
-#include <concepts>
+
+#include "core/little_endian.h"
 
 namespace systeminfo {
 namespace {
 
-// The number at `offset`, whose bytes the caller has made sure of.
-template <std::unsigned_integral Number>
-Number ReadNumber(std::string_view bytes, size_t offset) {
-  uint64_t number = 0;
-  for (size_t i = 0; i < sizeof(Number); ++i)
-    number |= uint64_t{static_cast<uint8_t>(bytes[offset + i])} << (8 * i);
-  return static_cast<Number>(number);
-}
-
 ScanCacheRecord ParseRecord(std::string_view bytes) {
   ScanCacheRecord record;
-  record.fileReferenceNumber = ReadNumber<uint64_t>(bytes, 0);
-  record.volumeSerialNumber = ReadNumber<uint32_t>(bytes, 8);
-  record.references = ReadNumber<uint32_t>(bytes, 12);
-  record.keyAndScan = ReadNumber<uint32_t>(bytes, 16);
-  record.scanPhase = ReadNumber<uint16_t>(bytes, 20);
-  record.flagFromDat = ReadNumber<uint16_t>(bytes, 22);
-  record.cloudFlags = ReadNumber<uint32_t>(bytes, 24);
-  record.internalFlags = ReadNumber<uint32_t>(bytes, 28);
-  record.lastAccessTime = ReadNumber<uint64_t>(bytes, 32);
-  record.lastScanTime = ReadNumber<uint64_t>(bytes, 40);
-  record.extraFlags1 = ReadNumber<uint16_t>(bytes, 48);
-  record.extraFlags2 = ReadNumber<uint16_t>(bytes, 50);
+  record.fileReferenceNumber = ReadLittleEndian<uint64_t>(bytes, 0);
+  record.volumeSerialNumber = ReadLittleEndian<uint32_t>(bytes, 8);
+  record.references = ReadLittleEndian<uint32_t>(bytes, 12);
+  record.keyAndScan = ReadLittleEndian<uint32_t>(bytes, 16);
+  record.scanPhase = ReadLittleEndian<uint16_t>(bytes, 20);
+  record.flagFromDat = ReadLittleEndian<uint16_t>(bytes, 22);
+  record.cloudFlags = ReadLittleEndian<uint32_t>(bytes, 24);
+  record.internalFlags = ReadLittleEndian<uint32_t>(bytes, 28);
+  record.lastAccessTime = ReadLittleEndian<uint64_t>(bytes, 32);
+  record.lastScanTime = ReadLittleEndian<uint64_t>(bytes, 40);
+  record.extraFlags1 = ReadLittleEndian<uint16_t>(bytes, 48);
+  record.extraFlags2 = ReadLittleEndian<uint16_t>(bytes, 50);
   for (size_t i = 0; i < std::size(record.databaseKeys); ++i)
-    record.databaseKeys[i] = ReadNumber<uint32_t>(bytes, 52 + i * sizeof(uint32_t));
-  const uint8_t options = ReadNumber<uint8_t>(bytes, 64);
+    record.databaseKeys[i] = ReadLittleEndian<uint32_t>(bytes, 52 + i * sizeof(uint32_t));
+  const uint8_t options = ReadLittleEndian<uint8_t>(bytes, 64);
   record.scanEmail = (options & 1) != 0;
   record.scanPacked = (options & 2) != 0;
   record.scanArchives = (options & 4) != 0;
   record.deepScan = (options & 8) != 0;
-  record.maxArchiveDepthLevel = ReadNumber<uint8_t>(bytes, 65);
-  record.maxArchiveFileSize = ReadNumber<uint32_t>(bytes, 68);
+  record.maxArchiveDepthLevel = ReadLittleEndian<uint8_t>(bytes, 65);
+  record.maxArchiveFileSize = ReadLittleEndian<uint32_t>(bytes, 68);
   return record;
 }
 
@@ -47,7 +39,7 @@ ScanCache ParseScanCache(std::string_view bytes, size_t mostRecords) {
   ScanCache cache;
   if (bytes.size() < kScanCacheCountOffset + sizeof(uint32_t)) return cache;
   cache.hasHeader = true;
-  cache.entryCount = ReadNumber<uint32_t>(bytes, kScanCacheCountOffset);
+  cache.entryCount = ReadLittleEndian<uint32_t>(bytes, kScanCacheCountOffset);
   bytes.remove_prefix(std::min(kScanCacheRecordsOffset, bytes.size()));
   const size_t wanted = std::min<size_t>(cache.entryCount, mostRecords);
   const size_t present = std::min(wanted, bytes.size() / kScanCacheRecordSize);

@@ -2,12 +2,49 @@
 
 #include <windows.h>
 
+#include <algorithm>
 #include <cstring>
-#include <vector>
+#include <utility>
 
 #include "core/files.h"
+#include "core/scoped.h"
+#include "systeminfo/utils/version_resource.h"
 
 namespace systeminfo::utils {
+namespace {
+
+// Small pieces of a file, which mostly lie close together.
+class FilePieces {
+ public:
+  explicit FilePieces(KernelHandle file) : m_file(std::move(file)) {}
+
+  bool IsOpen() const { return static_cast<bool>(m_file); }
+
+  bool Read(uint64_t offset, size_t size, std::string& bytes) {
+    const bool isHeld = offset >= m_offset && offset - m_offset <= m_window.size() &&
+                        size <= m_window.size() - static_cast<size_t>(offset - m_offset);
+    if (!isHeld && !Fill(offset, size)) return false;
+    bytes.assign(m_window, static_cast<size_t>(offset - m_offset), size);
+    return true;
+  }
+
+ private:
+  bool Fill(uint64_t offset, size_t size) {
+    constexpr size_t kWindow = size_t{16} << 10;
+    LARGE_INTEGER position{};
+    position.QuadPart = static_cast<LONGLONG>(offset);
+    m_offset = offset;
+    m_window.clear();
+    return SetFilePointerEx(m_file.Get(), position, nullptr, FILE_BEGIN) &&
+           ReadBytes(m_file.Get(), std::max(size, kWindow), m_window) == ERROR_SUCCESS && m_window.size() >= size;
+  }
+
+  const KernelHandle m_file;
+  uint64_t m_offset = 0;
+  std::string m_window;  // the bytes of the file from there on
+};
+
+}  // namespace
 
 std::string FixedInfoVersion(std::string_view fixedInfo) {
   VS_FIXEDFILEINFO info;
@@ -24,19 +61,11 @@ std::string FixedInfoVersion(std::string_view fixedInfo) {
 }
 
 std::string GetFileVersion(std::wstring_view path) {
-  const std::wstring extended = ExtendedPath(path);
-  DWORD ignored = 0;
-  const DWORD size = GetFileVersionInfoSizeW(extended.c_str(), &ignored);
-  if (size == 0) return {};
-  std::vector<char> resource(size);
-  if (!GetFileVersionInfoW(extended.c_str(), 0, size, resource.data())) return {};
-  void* block = nullptr;
-  UINT length = 0;
+  FilePieces file(OpenForReading(path));
+  if (!file.IsOpen()) return {};
   SetLastError(ERROR_RESOURCE_DATA_NOT_FOUND);
-  if (!VerQueryValueW(resource.data(), L"\\", &block, &length) || block == nullptr) return {};
-  std::string version = FixedInfoVersion({static_cast<const char*>(block), length});
-  if (version.empty()) SetLastError(ERROR_RESOURCE_DATA_NOT_FOUND);
-  return version;
+  return FixedInfoVersion(FindFixedVersionInfo(
+      [&file](uint64_t offset, size_t size, std::string& bytes) { return file.Read(offset, size, bytes); }));
 }
 
 }  // namespace systeminfo::utils
