@@ -184,6 +184,16 @@ def walk(bench):
     yield Line("walk", f"{figures['walk_dir ms']} ms", f"{figures['bare ms']} ms", float(figures["ratio"]), 1.5)
 
 
+def product_files(bench):
+    folder = f"{FOLDER}/product"
+    with open(f"{bench.programs}/product_part.dll", "rb") as part:
+        paths = make_corpus.make_product(folder, part.read())
+    ours = bench.ours("product_files_bench", "product")
+    if f"records={len(paths)}" not in bench.output(ours):
+        raise RuntimeError("not every file was described")
+    yield bench.compare("product-files", 0.60, ours, ["openssl", "md5", *paths])
+
+
 def start(bench):
     # Without a job the program comes up, writes its first lines and ends: a little more than what the goal is about.
     yield bench.compare("start", 4, bench.ours("support_tool", "nogui"), bench.ours("empty_program"), peer_in_wine=True)
@@ -196,6 +206,7 @@ ROWS = {
     "pack-memory": ("peak memory of packing over an idle run", pack_memory),
     "encrypt": ("RC4 of 50 MiB, file to file, against openssl enc -rc4; its peak memory", encrypt),
     "walk": ("10,000 files, against a bare FindFirstFile loop", walk),
+    "product-files": ("version and MD5 of 500 libraries, 400 MB, against openssl md5", product_files),
     "start": ("start, first log lines, end; against an empty GUI program", start),
 }
 

@@ -126,6 +126,21 @@ def make_big(folder):
     write(f"{folder}/product.log", log_text(random.Random(3), 50 * MIB), 0)
 
 
+def make_product(folder, part):
+    """500 libraries, 400 MB together: `part`, the bytes of one, and behind them what does not compress. Made anew unless
+    it is complete already. Returns the paths."""
+    rng = random.Random(4)
+    names = [f"{folder}/component_{index // 50}/{index}_{MODULES[index % len(MODULES)]}" for index in range(500)]
+    paths = [name if name.endswith((".exe", ".dll")) else f"{name}.dll" for name in names]
+    stamp = f"{folder}.complete"
+    if not os.path.exists(stamp):
+        shutil.rmtree(folder, ignore_errors=True)
+        for index, size in enumerate(sizes(rng, len(paths), 400_000_000 - len(paths) * len(part), 1.2)):
+            write(paths[index], part + noise(rng, size), index)
+        open(stamp, "w").close()
+    return paths
+
+
 CORPORA = {"mixed": make_mixed, "small": make_small, "big": make_big}
 
 
