@@ -1,6 +1,7 @@
 #include "systeminfo/collector_table.h"
 
 #include "systeminfo/installed_software_collector.h"
+#include "systeminfo/process_collector.h"
 #include "systeminfo/product_information_collector.h"
 #include "systeminfo/startup_programs_collector.h"
 #include "systeminfo/system_summary.h"
@@ -16,6 +17,7 @@ std::shared_ptr<ICollector> Make(std::wstring name) {
 // The only list. A collector that writes the same file as an earlier one replaces it.
 constexpr CollectorRow kCollectors[] = {
     {L"system_summary", L"SystemSummary", &Make<SystemSummary>},
+    {L"running_tasks", L"ProcessCollector", &Make<ProcessCollector>},
     {L"startup_programs", L"StartupProgramsCollector", &Make<StartupProgramsCollector>},
     {L"installed_software", L"InstalledSoftwareCollector", &Make<InstalledSoftwareCollector>},
     {L"product_information", L"ProductInformationCollector", &Make<ProductInformationCollector>},

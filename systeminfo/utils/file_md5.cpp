@@ -26,7 +26,7 @@ class FileHasher {
     if (!file) {
       // The name of the call in the text is kept; the code is the system's.
       if (const DWORD error = GetLastError(); error != ERROR_SUCCESS) {
-        LOG_ERROR(kScope, L"fopen_s %s fails with %d", ToWide(path).c_str(), static_cast<int>(error));
+        LOG_TRACE(kScope, L"fopen_s %s fails with %d", ToWide(path).c_str(), static_cast<int>(error));
       } else {
         std::printf("%s can't be opened.\n", path.c_str());
       }
