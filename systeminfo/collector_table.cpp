@@ -1,5 +1,6 @@
 #include "systeminfo/collector_table.h"
 
+#include "systeminfo/process_collector.h"
 #include "systeminfo/registry_collector.h"
 #include "systeminfo/system_summary.h"
 
@@ -14,6 +15,7 @@ std::shared_ptr<ICollector> Make(std::wstring name) {
 // The only list. A collector that writes the same file as an earlier one replaces it.
 constexpr CollectorRow kCollectors[] = {
     {L"system_summary", L"SystemSummary", &Make<SystemSummary>},
+    {L"running_tasks", L"ProcessCollector", &Make<ProcessCollector>},
     {L"registry", L"RegistryCollector", &Make<RegistryCollector>},
 };
 

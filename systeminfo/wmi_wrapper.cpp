@@ -121,6 +121,22 @@ int WMIWrapper::ExecuteQuery(const std::wstring& query, const Names& names, Tabl
   });
 }
 
+WMIWrapper::Names WMIWrapper::PropertiesOf(const std::wstring& className, const Names& names) {
+  const ScopedBstr path = MakeBstr(className);
+  ComPtr<IWbemClassObject> definition;
+  if (!m_services || FAILED(m_services->GetObject(path.Get(), 0, nullptr, definition.Receive(), nullptr)) ||
+      !definition) {
+    return names;
+  }
+  Names known;
+  for (const std::wstring& name : names) {
+    ScopedVariant ignored;
+    if (definition->Get(name.c_str(), 0, ignored.Receive(), nullptr, nullptr) != static_cast<HRESULT>(WBEM_E_NOT_FOUND))
+      known.push_back(name);
+  }
+  return known;
+}
+
 const wchar_t* WbemErrorName(HRESULT code) {
   switch (static_cast<unsigned>(code)) {
     case 0:

@@ -44,6 +44,10 @@ class WMIWrapper {
   int ExecuteQuery(const std::wstring& query, const Names& names, Rows& rows);    // appends one row for each instance
   int ExecuteQuery(const std::wstring& query, const Names& names, Table& table);  // likewise
 
+  // Those of `names` that the class has on this system: not every version has them all. All of them when the class
+  // cannot be asked.
+  Names PropertiesOf(const std::wstring& className, const Names& names);
+
  private:
   using InstanceVisitor = std::function<void(IWbemClassObject& instance)>;
   int VisitInstances(const std::wstring& query, bool onlyFirst, const InstanceVisitor& visit);

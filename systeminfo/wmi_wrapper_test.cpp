@@ -134,6 +134,10 @@ TEST(WMIWrapper, LiveQueriesReturnTheMachinesOwnData) {
       EXPECT_THAT(errors.Take(), ElementsAre(L"WMIWrapper::ExecuteQuery: IWbemClassObject->Get failed with message "
                                              L"WBEM_E_NOT_FOUND"));
       EXPECT_EQ(wmi.ExecuteQuery(L"this is no query", {L"Name"}, rows), 1);
+
+      EXPECT_THAT(wmi.PropertiesOf(L"Win32_Process", {L"ProcessId", L"NoSuchProperty", L"Name"}),
+                  ElementsAre(L"ProcessId", L"Name"));
+      EXPECT_THAT(wmi.PropertiesOf(L"No_SuchClass", {L"Name"}), ElementsAre(L"Name"));
     }
     APTTYPE type{};
     APTTYPEQUALIFIER qualifier{};

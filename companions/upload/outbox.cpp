@@ -3,8 +3,8 @@
 #include <algorithm>
 #include <vector>
 
-#include "companions/upload/hex.h"
-#include "companions/upload/sha256.h"
+#include "core/hex.h"
+#include "core/digest.h"
 #include "core/files.h"
 #include "core/format.h"
 #include "core/json.h"
@@ -52,7 +52,7 @@ struct CopyTotals {
 int32_t CopyIntoFile(const UploadRequest& request, UploadSource& source, PartialFile& file, CopyTotals& totals) {
   std::vector<char> buffer(kBufferSize);
   ProgressReport progress(request, source.Size());
-  Sha256 hash;
+  Digest hash(BCRYPT_SHA256_ALGORITHM);
   for (;;) {
     size_t count = 0;
     if (const DWORD error = source.Read(buffer, count); error != ERROR_SUCCESS) {

@@ -50,12 +50,9 @@ class Bench:
         self.programs = programs
         self.rounds = rounds
         self.wine = wine_environment()
-        self._corpora = None
 
     def corpus(self, name):
-        if self._corpora is None:
-            self._corpora = make_corpus.make_corpus(FOLDER)
-        return self._corpora[name]
+        return make_corpus.make_corpus(FOLDER, name)
 
     def ours(self, program, *arguments):
         """The command line of a program of the build; to be run with `wine=True`."""
@@ -178,6 +175,17 @@ def encrypt(bench):
         remove(path)
 
 
+def md5(bench):
+    folder = bench.corpus("pe")
+    files = sorted(os.path.join(at, name) for at, _, names in os.walk(folder) for name in names)
+    ours, peer = bench.ours("md5_bench", folder), ["openssl", "md5", "-r", *files]
+    expected = subprocess.run(peer, check=True, text=True, stdout=subprocess.PIPE).stdout
+    digests = sorted(line.split()[0] for line in expected.splitlines())
+    if digests != sorted(re.findall(r"^([0-9a-f]{32}) ", bench.output(ours), re.MULTILINE)):
+        raise RuntimeError("the digests differ from the peer's")
+    yield bench.compare("md5", 0.60, ours, peer)
+
+
 def walk(bench):
     command = bench.ours("walk_bench", bench.corpus("small"))
     figures = dict(re.findall(r"(walk_dir ms|bare ms|ratio)=([0-9.]+)", bench.output(command)))
@@ -195,6 +203,7 @@ ROWS = {
     "pack-big": ("one file of 50 MiB, against zip -6", pack("big", 0.75, 1.01)),
     "pack-memory": ("peak memory of packing over an idle run", pack_memory),
     "encrypt": ("RC4 of 50 MiB, file to file, against openssl enc -rc4; its peak memory", encrypt),
+    "md5": ("MD5 of 600 executables and libraries, 600 MiB, against openssl md5", md5),
     "walk": ("10,000 files, against a bare FindFirstFile loop", walk),
     "start": ("start, first log lines, end; against an empty GUI program", start),
 }

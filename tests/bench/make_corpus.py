@@ -1,11 +1,12 @@
 #!/usr/bin/env python3
 """Makes the files that the benchmarks pack, the same bytes on every machine.
 
-usage: make_corpus.py FOLDER      makes FOLDER/mixed, FOLDER/small and FOLDER/big; what is complete already is kept.
+usage: make_corpus.py FOLDER      makes the folders below in FOLDER; what is complete already is kept.
 
 mixed   400 files, 50 MiB together, as a support collection has them: collectors' JSON, logs, some that do not compress
 small   10,000 files, 38 MiB together
 big     one log of 50 MiB
+pe      600 files of the sizes that executables and libraries have, 600 MiB together
 """
 import itertools
 import os
@@ -126,21 +127,27 @@ def make_big(folder):
     write(f"{folder}/product.log", log_text(random.Random(3), 50 * MIB), 0)
 
 
-CORPORA = {"mixed": make_mixed, "small": make_small, "big": make_big}
+def make_pe(folder):
+    rng = random.Random(4)
+    for index, size in enumerate(sizes(rng, 600, 600 * MIB, 1.2)):
+        write(f"{folder}/{index // 100}/module_{index}.{'exe' if index % 5 == 0 else 'dll'}", (b"MZ" + noise(rng, size))[:size], index)
 
 
-def make_corpus(root):
-    """Returns the folder of each corpus by its name."""
-    for name, make in CORPORA.items():
-        folder, stamp = f"{root}/{name}", f"{root}/{name}.complete"
-        if not os.path.exists(stamp):
-            shutil.rmtree(folder, ignore_errors=True)
-            make(folder)
-            open(stamp, "w").close()
-    return {name: f"{root}/{name}" for name in CORPORA}
+CORPORA = {"mixed": make_mixed, "small": make_small, "big": make_big, "pe": make_pe}
+
+
+def make_corpus(root, name):
+    """Returns the folder of that corpus."""
+    folder, stamp = f"{root}/{name}", f"{root}/{name}.complete"
+    if not os.path.exists(stamp):
+        shutil.rmtree(folder, ignore_errors=True)
+        CORPORA[name](folder)
+        open(stamp, "w").close()
+    return folder
 
 
 if __name__ == "__main__":
     if len(sys.argv) != 2:
         sys.exit(__doc__)
-    make_corpus(sys.argv[1])
+    for corpus in CORPORA:
+        make_corpus(sys.argv[1], corpus)

@@ -1,4 +1,5 @@
-// SHA-256 of bytes that come piece by piece.
+// A digest (MD5, SHA-256, …) of bytes that come piece by piece, made by the system's own cryptography. One object may
+// make many digests, one after another; it is used by one thread at a time.
 #pragma once
 
 #include <windows.h>
@@ -9,8 +10,6 @@
 #include <string_view>
 
 #include "core/scoped.h"
-
-namespace qxlink {
 
 struct HashAlgorithmTraits {
   using Type = BCRYPT_ALG_HANDLE;
@@ -26,19 +25,21 @@ struct HashTraits {
 };
 using Hash = Scoped<HashTraits>;
 
-class Sha256 {
+class Digest {
  public:
-  Sha256();
+  // `algorithm` by its name: BCRYPT_MD5_ALGORITHM, BCRYPT_SHA256_ALGORITHM, …
+  explicit Digest(const wchar_t* algorithm);
 
+  // Of at most 4 GiB.
   void Add(std::string_view bytes);
 
-  // In lower-case hexadecimal digits, once; empty when the system failed at any step.
+  // In lower-case hexadecimal digits, empty when the system failed at any step. The next Add begins the next digest.
   std::string Finish();
 
  private:
+  bool Begin();
+
   HashAlgorithm m_algorithm;
   Hash m_hash;
   bool m_isGood = false;
 };
-
-}  // namespace qxlink
