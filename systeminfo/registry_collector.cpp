@@ -16,7 +16,7 @@ void RegistryCollector::Start(const std::shared_ptr<CollectingSettings>& setting
                               const std::atomic<bool>* cancel) {
   const Json::Value paths = settings->GetValue(m_name);
   if (!paths.isArray() && !paths.isObject()) {
-    LOG_INFO(kStart, L"No registry keys to query found");
+    LOG_TRACE(kStart, L"No registry keys to query found");
     return;
   }
   for (const Json::Value& path : paths) {

@@ -33,7 +33,7 @@ class RegistryCollectorTest : public testing::Test {
   std::string Path() const { return ToUtf8(m_test.Path()); }
 
   TestRegistryKey m_test;
-  logging::ErrorCapture m_log{logging::Level::kInfo};
+  logging::ErrorCapture m_log{logging::Level::kTrace};
 };
 
 TEST_F(RegistryCollectorTest, ASettingThatIsNoListIsNoData) {
