@@ -1,8 +1,10 @@
 #include "systeminfo/utils/mini_dump.h"
 
+#include <mutex>
 #include <string>
 
 #include "core/format.h"
+#include "core/lock.h"
 
 namespace utils {
 namespace {
@@ -49,6 +51,8 @@ BOOL FilterMiniDump(const MiniDumpLog& log, const MINIDUMP_CALLBACK_INPUT* input
 }
 
 DWORD WriteMiniDump(HANDLE process, DWORD processId, HANDLE file, MINIDUMP_CALLBACK_ROUTINE callback) {
+  static SharedLock lock;  // the library serves one thread at a time
+  const std::lock_guard guard(lock);
   MINIDUMP_CALLBACK_INFORMATION information{callback, nullptr};
   if (MiniDumpWriteDump(process, processId, file, kMiniDumpType, nullptr, nullptr, &information)) return ERROR_SUCCESS;
   const DWORD error = GetLastError();

@@ -38,7 +38,8 @@ struct VmRegionAnswer {
 };
 
 // Writes a minidump of the process to a file that is open for reading and writing. 0, or the error code of the system,
-// which may be an HRESULT; the file may hold a part of a dump then.
+// which may be an HRESULT; the file may hold a part of a dump then. Any thread may
+// call it; dumps are written one after another.
 DWORD WriteMiniDump(HANDLE process, DWORD processId, HANDLE file, MINIDUMP_CALLBACK_ROUTINE callback);
 
 }  // namespace utils
