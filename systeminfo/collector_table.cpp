@@ -1,6 +1,7 @@
 #include "systeminfo/collector_table.h"
 
 #include "systeminfo/process_collector.h"
+#include "systeminfo/process_dump_collector.h"
 #include "systeminfo/registry_collector.h"
 #include "systeminfo/system_summary.h"
 
@@ -16,6 +17,7 @@ std::shared_ptr<ICollector> Make(std::wstring name) {
 constexpr CollectorRow kCollectors[] = {
     {L"system_summary", L"SystemSummary", &Make<SystemSummary>},
     {L"running_tasks", L"ProcessCollector", &Make<ProcessCollector>},
+    {L"process_dumps", L"ProcessDumpCollector", &Make<ProcessDumpCollector>},
     {L"registry", L"RegistryCollector", &Make<RegistryCollector>},
 };
 
