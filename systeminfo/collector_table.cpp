@@ -2,7 +2,9 @@
 
 #include "systeminfo/installed_software_collector.h"
 #include "systeminfo/process_collector.h"
+#include "systeminfo/process_dump_collector.h"
 #include "systeminfo/product_information_collector.h"
+#include "systeminfo/registry_collector.h"
 #include "systeminfo/startup_programs_collector.h"
 #include "systeminfo/system_summary.h"
 
@@ -20,7 +22,9 @@ constexpr CollectorRow kCollectors[] = {
     {L"running_tasks", L"ProcessCollector", &Make<ProcessCollector>},
     {L"startup_programs", L"StartupProgramsCollector", &Make<StartupProgramsCollector>},
     {L"installed_software", L"InstalledSoftwareCollector", &Make<InstalledSoftwareCollector>},
+    {L"process_dumps", L"ProcessDumpCollector", &Make<ProcessDumpCollector>},
     {L"product_information", L"ProductInformationCollector", &Make<ProductInformationCollector>},
+    {L"registry", L"RegistryCollector", &Make<RegistryCollector>},
 };
 
 }  // namespace

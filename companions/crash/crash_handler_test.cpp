@@ -17,6 +17,7 @@
 #include "core/program_path.h"
 #include "core/text.h"
 #include "interfaces/crash_handler_api.h"
+#include "tests/support/dump_streams.h"
 #include "tests/support/test_folder.h"
 
 namespace {
@@ -90,26 +91,6 @@ class CrashFolder {
  private:
   TestFolder m_folder;
 };
-
-template <class Stream>
-const Stream* FindStream(std::string& dump, ULONG kind) {
-  MINIDUMP_DIRECTORY* directory = nullptr;
-  void* stream = nullptr;
-  ULONG size = 0;
-  const bool found = !dump.empty() && MiniDumpReadDumpStream(dump.data(), kind, &directory, &stream, &size);
-  EXPECT_TRUE(found && size >= sizeof(Stream)) << "stream " << kind;
-  return found ? static_cast<const Stream*>(stream) : nullptr;
-}
-
-std::vector<std::wstring> ModuleNames(std::string& dump) {
-  std::vector<std::wstring> names;
-  const auto* const modules = FindStream<MINIDUMP_MODULE_LIST>(dump, ModuleListStream);
-  for (ULONG i = 0; modules != nullptr && i < modules->NumberOfModules; ++i) {
-    const auto* const text = reinterpret_cast<const MINIDUMP_STRING*>(dump.data() + modules->Modules[i].ModuleNameRva);
-    names.emplace_back(LastPathComponent(std::wstring(text->Buffer, text->Length / sizeof(wchar_t))));
-  }
-  return names;
-}
 
 // Null if the thread is not in the dump.
 const MINIDUMP_THREAD* FindThread(std::string& dump, DWORD id) {

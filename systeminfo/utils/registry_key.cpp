@@ -70,9 +70,9 @@ class ValueBuffers {
 
   // After ERROR_MORE_DATA, which does not say which buffer is too small.
   void Grow() {
-    constexpr size_t kLongestName = 16383;
+    constexpr size_t kLongestName = 16383, kLeastData = 4096;
     m_name.resize(kLongestName + 1);
-    m_data.resize(std::max<size_t>(m_dataSize, m_data.size() + m_data.size() / 2 + 16));
+    m_data.resize(std::max({size_t{m_dataSize}, m_data.size() * 2, kLeastData}));
   }
 
   RegistryValue Value() const {

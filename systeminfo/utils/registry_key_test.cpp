@@ -3,6 +3,7 @@
 #include <gmock/gmock.h>
 
 #include <map>
+#include <thread>
 
 #include "core/format.h"
 #include "core/logging.h"
@@ -86,6 +87,27 @@ TEST(RegistryKey, OneValueIsFoundInAnyCaseAndWhateverItsSize) {
     EXPECT_EQ(key.GetValue(Format(L"%u", static_cast<unsigned>(size)))->data, std::string(size, 's'));
   EXPECT_FALSE(key.GetValue(L"absent"));
   EXPECT_FALSE(key.GetValue(std::wstring_view(L"displayname\0", 12)));
+}
+
+TEST(RegistryKey, AValueThatChangesMeanwhileIsReadAsItWasAtOneTime) {
+  const TestRegistryKey test;
+  const std::string small(1, 's'), large(100'000, 'l');
+  test.SetValue({}, L"x", REG_BINARY, small);
+  std::jthread writer([&](const std::stop_token& stop) {
+    while (!stop.stop_requested())
+      for (const std::string& data : {large, small})
+        test.SetValue({}, L"x", REG_BINARY, data);
+  });
+  logging::ErrorCapture log;
+  const RegistryKey key(test.Path());
+  for (int i = 0; i < 500; ++i) {
+    const std::vector<RegistryValue> values = key.GetValues();
+    ASSERT_EQ(values.size(), 1u);
+    ASSERT_TRUE(values[0].data == small || values[0].data == large) << values[0].data.size();
+    const std::string one = key.GetValue(L"x")->data;
+    ASSERT_TRUE(one == small || one == large) << one.size();
+  }
+  EXPECT_TRUE(log.Take().empty());
 }
 
 TEST(RegistryKey, SubkeysAreWalkedAndOpenedUntilTheCallbackHasEnough) {
