@@ -7,3 +7,14 @@
 
 std::string ToUtf8(std::wstring_view text);
 std::wstring ToWide(std::string_view utf8);
+
+// The text without blanks, tabs and line ends at either end; null counts as empty. Points into `text`.
+inline std::string_view Trimmed(std::string_view text) {
+  constexpr std::string_view kBlanks = " \t\r\n";
+  const size_t first = text.find_first_not_of(kBlanks);
+  if (first == std::string_view::npos) return {};
+  return text.substr(first, text.find_last_not_of(kBlanks) - first + 1);
+}
+inline std::string_view Trimmed(const char* text) {
+  return text == nullptr ? std::string_view() : Trimmed(std::string_view(text));
+}

@@ -26,3 +26,10 @@ TEST(Text, EachBadUnitBecomesTheReplacementCharacter) {
     EXPECT_EQ(ToWide(bad), L"a\uFFFDz") << bad;
   EXPECT_EQ(ToWide("a\xE2\x82").substr(0, 2), L"a\uFFFD") << "cut off in the middle";
 }
+
+TEST(Text, TrimmedTextHasNoBlanksAtItsEnds) {
+  EXPECT_EQ(Trimmed(" \r\n\ta b\t \n"), "a b");
+  EXPECT_EQ(Trimmed("a"), "a");
+  for (const char* blank : {"", " ", "\r\n", static_cast<const char*>(nullptr)})
+    EXPECT_EQ(Trimmed(blank), "");
+}

@@ -2,16 +2,10 @@
 
 #include <tinyxml2.h>
 
+#include "core/text.h"
+
 namespace systeminfo {
 namespace {
-
-std::string_view Trimmed(const char* text) {
-  constexpr std::string_view kBlanks = " \t\r\n";
-  const std::string_view all(text == nullptr ? "" : text);
-  const size_t first = all.find_first_not_of(kBlanks);
-  if (first == std::string_view::npos) return {};
-  return all.substr(first, all.find_last_not_of(kBlanks) - first + 1);
-}
 
 // {"time": ...} of the child `name` of `element`; null when there is no such child.
 Json::Value ReadTime(const tinyxml2::XMLElement& element, const char* name, UpdateStatistics& statistics) {

@@ -5,16 +5,10 @@
 #include <charconv>
 #include <optional>
 
+#include "core/text.h"
+
 namespace crash {
 namespace {
-
-std::string_view Trimmed(const char* text) {
-  constexpr std::string_view kBlanks = " \t\r\n";
-  const std::string_view all(text == nullptr ? "" : text);
-  const size_t first = all.find_first_not_of(kBlanks);
-  if (first == std::string_view::npos) return {};
-  return all.substr(first, all.find_last_not_of(kBlanks) - first + 1);
-}
 
 std::optional<uint32_t> ParseCount(std::string_view text) {
   uint32_t count = 0;

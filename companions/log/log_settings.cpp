@@ -6,6 +6,8 @@
 #include <limits>
 #include <span>
 
+#include "core/text.h"
+
 namespace logfile {
 namespace {
 
@@ -36,13 +38,6 @@ bool SameWord(std::string_view a, std::string_view b) {
     if (Upper(a[i]) != Upper(b[i])) return false;
   }
   return true;
-}
-
-std::string_view Trimmed(std::string_view text) {
-  constexpr std::string_view kBlanks = " \t\r\n";
-  const size_t first = text.find_first_not_of(kBlanks);
-  if (first == std::string_view::npos) return {};
-  return text.substr(first, text.find_last_not_of(kBlanks) - first + 1);
 }
 
 std::optional<uint32_t> ParseWord(std::string_view text, std::span<const Word> words) {
