@@ -70,17 +70,6 @@ KernelHandle OpenForAttributes(const std::wstring& extended, DWORD flags) {
                                   nullptr));
 }
 
-// Where the system says the folder really is; empty when it cannot be asked.
-std::wstring FinalPath(const std::wstring& extended) {
-  const KernelHandle folder = OpenForAttributes(extended, FILE_FLAG_BACKUP_SEMANTICS);
-  if (!folder) return {};
-  constexpr DWORD kLongestPath = 32767;
-  std::wstring path(kLongestPath + 1, L'\0');
-  const DWORD length = GetFinalPathNameByHandleW(folder.Get(), path.data(), kLongestPath + 1, FILE_NAME_NORMALIZED);
-  path.resize(length <= kLongestPath ? length : 0);
-  return path;
-}
-
 }  // namespace
 
 std::wstring OutputFolderRefusal(std::wstring_view folder, const std::vector<ProtectedFolder>& protectedFolders) {
@@ -101,7 +90,8 @@ std::wstring OutputFolderRefusal(std::wstring_view folder, const std::vector<Pro
 std::wstring NormalFolder(std::wstring_view folder) {
   std::wstring extended = ExtendedPath(folder);
   if (extended.find(L'\0') != std::wstring::npos) return extended;
-  std::wstring final = FinalPath(extended);
+  const KernelHandle handle = OpenForAttributes(extended, FILE_FLAG_BACKUP_SEMANTICS);
+  std::wstring final = handle ? FinalPath(handle.Get()) : std::wstring();
   return final.starts_with(kLocalPrefix) ? final : extended;
 }
 

@@ -111,6 +111,18 @@ std::wstring ShownPath(std::wstring_view extendedPath) {
   return std::wstring(isOnDrive ? rest : extendedPath);
 }
 
+std::wstring FinalPath(HANDLE file) {
+  constexpr DWORD kLongestPath = 32767;
+  std::wstring path(MAX_PATH, L'\0');
+  DWORD length = GetFinalPathNameByHandleW(file, path.data(), MAX_PATH, FILE_NAME_NORMALIZED);
+  if (length >= MAX_PATH) {  // then it is the size that is needed
+    path.resize(kLongestPath + 1);
+    length = GetFinalPathNameByHandleW(file, path.data(), kLongestPath + 1, FILE_NAME_NORMALIZED);
+  }
+  path.resize(length <= kLongestPath ? length : 0);
+  return path;
+}
+
 bool PathExists(std::wstring_view path) {
   return GetFileAttributesW(ExtendedPath(path).c_str()) != INVALID_FILE_ATTRIBUTES;
 }

@@ -22,6 +22,9 @@ std::wstring ExtendPath(std::wstring_view path, std::wstring_view currentDirecto
 // An extended path as people and other programs write it: without the prefix. Other paths stay as they are.
 std::wstring ShownPath(std::wstring_view extendedPath);
 
+// Where the system says that an open file or folder is, as an extended path; empty when it does not say it.
+std::wstring FinalPath(HANDLE file);
+
 bool PathExists(std::wstring_view path);    // a file or a folder
 bool FolderExists(std::wstring_view path);  // a folder
 

@@ -31,18 +31,6 @@ std::wstring DriveOf(uint32_t volumeSerialNumber) {
   return {};
 }
 
-std::wstring FinalPath(HANDLE file) {
-  constexpr DWORD kLongestPath = 32767;
-  std::wstring path(MAX_PATH, L'\0');
-  DWORD length = GetFinalPathNameByHandleW(file, path.data(), MAX_PATH, FILE_NAME_NORMALIZED);
-  if (length >= MAX_PATH) {  // then it is the size that is needed
-    path.resize(kLongestPath + 1);
-    length = GetFinalPathNameByHandleW(file, path.data(), kLongestPath + 1, FILE_NAME_NORMALIZED);
-  }
-  path.resize(length <= kLongestPath ? length : 0);
-  return path;
-}
-
 }  // namespace
 
 const KernelHandle& FileReferences::RootOf(uint32_t volumeSerialNumber) {
