@@ -15,16 +15,16 @@
 namespace systeminfo {
 namespace {
 
-Json::Value FileRecord(const std::string& path, std::string md5) {
+Json::Value FileRecord(const std::string& path, const std::string& md5) {
   Json::Value record(Json::objectValue);
   record["path"] = path;
-  record["md5"] = std::move(md5);
+  record["md5"] = md5;
   const std::wstring widePath = ToWide(path);
-  std::string version = utils::GetFileVersion(widePath);
+  const std::string version = utils::GetFileVersion(widePath);
   if (version.empty()) {
     LOG_ERROR(L"systeminfo::GetFileInformation", L"Failed to get version for file %s", widePath.c_str());
   }
-  record["version"] = std::move(version);
+  record["version"] = version;
   return record;
 }
 
@@ -45,10 +45,10 @@ Json::Value GetProductFileInformation(const std::wstring& installFolder, const s
   });
   if (!isWalked) LOG_ERROR(L"systeminfo::GetProductFileInformation", L"WalkDir returned false");
 
-  std::vector<std::string> digests = utils::GetFileMD5s(paths, cancel);
+  const std::vector<std::string> digests = utils::GetFileMD5s(paths, cancel);
   Json::Value records(Json::arrayValue);
   for (size_t i = 0; i < paths.size() && !IsCancelled(cancel); ++i)
-    records.append(FileRecord(paths[i], std::move(digests[i])));
+    records.append(FileRecord(paths[i], digests[i]));
   return records;
 }
 

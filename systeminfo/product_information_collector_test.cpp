@@ -24,7 +24,6 @@ namespace {
 using testing::Contains;
 using testing::ElementsAre;
 using testing::HasSubstr;
-using testing::IsEmpty;
 
 constexpr wchar_t kUninstall[] = L"machine\\Software\\Microsoft\\Windows\\CurrentVersion\\Uninstall\\";
 

@@ -72,8 +72,10 @@ TEST(ProductXml, HostileDocumentsEndQuickly) {
     nested += "<a>";
   std::string bomb = "<!DOCTYPE UpdateStatistics [<!ENTITY a0 'aaaaaaaaaa'>";
   for (int i = 1; i < 30; ++i) {
-    const std::string inner = "&a" + std::to_string(i - 1) + ";";
-    bomb += "<!ENTITY a" + std::to_string(i) + " '" + inner + inner + inner + "'>";
+    bomb.append("<!ENTITY a").append(std::to_string(i)).append(" '");
+    for (int copy = 0; copy < 3; ++copy)
+      bomb.append("&a").append(std::to_string(i - 1)).append(";");
+    bomb += "'>";
   }
   bomb += "]><UpdateStatistics><S><Check time='&a29;'/><Update time='1'/></S></UpdateStatistics>";
   EXPECT_EQ(ParseUpdateStatistics(nested).outcome, XmlOutcome::kNotXml);

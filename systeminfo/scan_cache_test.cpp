@@ -16,7 +16,6 @@ namespace {
 using scan_cache_file::FileBytes;
 using testing::Contains;
 using testing::HasSubstr;
-using testing::IsEmpty;
 
 // Every field its own value, the upper bits of each set.
 ScanCacheRecord DistinctRecord() {

@@ -13,11 +13,9 @@
 namespace systeminfo {
 namespace {
 
-using testing::Contains;
 using testing::ElementsAre;
 using testing::HasSubstr;
 using testing::IsEmpty;
-using testing::UnorderedElementsAre;
 
 constexpr wchar_t kRegistryScope[] = L"systeminfo::StartupProgramsCollector::FromRegistry: ";
 constexpr wchar_t kFileScope[] = L"systeminfo::StartupProgramsCollector::FromFilesystemPath: ";
