@@ -12,7 +12,7 @@
 template <class Job>
 auto Measure(Job job) {
   const auto begin = std::chrono::steady_clock::now();
-  const auto result = job();
+  auto result = job();
   const std::chrono::duration<double> seconds = std::chrono::steady_clock::now() - begin;
   PROCESS_MEMORY_COUNTERS counters{};
   K32GetProcessMemoryInfo(GetCurrentProcess(), &counters, sizeof counters);
