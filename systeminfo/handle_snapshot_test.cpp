@@ -2,6 +2,7 @@
 
 #include <gmock/gmock.h>
 
+#include <algorithm>
 #include <atomic>
 
 #include "core/logging.h"
@@ -24,12 +25,13 @@ TEST(HandleSnapshot, OpenHandlesOfAnotherProcessAreFoundWithTheirTypes) {
   std::vector<HandleInfo> handles;
   helper.GetHandleInformationForProcess(child.processId, handles);
   EXPECT_EQ(child.handles.size(), 4u);
-  for (const auto& [value, type] : child.handles) {
-    EXPECT_EQ(
-        std::count_if(handles.begin(), handles.end(),
-                      [&](const HandleInfo& handle) { return handle.value == value && handle.type == ToWide(type); }),
-        1)
-        << value << ' ' << type;
+  for (const auto& open : child.handles) {
+    EXPECT_EQ(std::count_if(handles.begin(), handles.end(),
+                            [&](const HandleInfo& handle) {
+                              return handle.value == open.first && handle.type == ToWide(open.second);
+                            }),
+              1)
+        << open.first << ' ' << open.second;
   }
   EXPECT_THAT(handles, Not(Contains(Field(&HandleInfo::value, child.closedHandle))));
 }
@@ -83,8 +85,9 @@ NTSTATUS NTAPI FakeQuerySystem(SYSTEM_INFORMATION_CLASS kind, void* reply, ULONG
   memcpy(bytes, &s_handles, sizeof s_handles);
   const uint32_t owner = GetCurrentProcessId();
   for (uint16_t i = 1; i <= s_handles && 8u + 24u * i <= size; ++i) {
-    memcpy(bytes + 8 + 24 * (i - 1), &owner, sizeof owner);
-    memcpy(bytes + 8 + 24 * (i - 1) + 6, &i, sizeof i);
+    char* const entry = bytes + 8 + size_t{24} * (i - 1u);
+    memcpy(entry, &owner, sizeof owner);
+    memcpy(entry + 6, &i, sizeof i);
   }
   return s_tableStatus;
 }
@@ -126,6 +129,7 @@ class FakeKernel : public testing::Test {
     helper.GetHandleInformationForProcess(GetCurrentProcessId(), handles);
     EXPECT_THAT(handles, Each(Field(&HandleInfo::type, L"File")));
     std::vector<uint64_t> values;
+    values.reserve(handles.size());
     for (const HandleInfo& handle : handles)
       values.push_back(handle.value);
     return values;

@@ -5,6 +5,7 @@
 
 #include "core/json.h"
 #include "core/logging.h"
+#include "core/scope_exit.h"
 #include "core/text.h"
 #include "systeminfo/utils/file_md5.h"
 #include "tests/support/fake_wmi.h"
@@ -20,7 +21,6 @@ using fake_wmi::Text;
 using testing::Contains;
 using testing::ElementsAre;
 using testing::HasSubstr;
-using testing::IsEmpty;
 
 const std::wstring kStart = L"systeminfo::ProcessCollector::Start: ";
 
@@ -129,6 +129,25 @@ TEST_F(Processes, RowsKeepTheirOrderAndEachCostsOnlyItsOwnFacts) {
   EXPECT_THAT(lines, Contains(HasSubstr(L"Could not open PID " + std::to_wstring(ended) + L"!")));
   EXPECT_THAT(lines, Contains(L"systeminfo::ProcessCollector::IsSigned: Invalid file handle when checking if it's "
                               L"signed"));
+}
+
+TEST_F(Processes, SuspendedProcessHoldsNothingUp) {
+  const std::wstring path = ProcessChild::Path();
+  STARTUPINFOW startup{};
+  startup.cb = sizeof startup;
+  PROCESS_INFORMATION started{};
+  ASSERT_TRUE(CreateProcessW(path.c_str(), nullptr, nullptr, nullptr, FALSE, CREATE_SUSPENDED, nullptr, nullptr,
+                             &startup, &started));
+  const KernelHandle process(started.hProcess);
+  const KernelHandle thread(started.hThread);
+  const ScopeExit end([&] { TerminateProcess(process.Get(), 1); });
+  m_instances = {Process(started.dwProcessId, Text(path)), Process(GetCurrentProcessId())};
+  const Json::Value processes = Collect()["processes"];
+  ASSERT_EQ(processes.size(), 2u);
+  EXPECT_NE(processes[0]["User"], "");
+  EXPECT_EQ(processes[0]["imageType"], "x32");
+  EXPECT_GT(processes[1]["modules"].size(), 0u);
+  EXPECT_GT(processes[1]["handles"].size(), 0u);
 }
 
 TEST_F(Processes, RowWithoutAllPropertiesEndsWithoutData) {

@@ -13,7 +13,6 @@ namespace {
 
 using testing::Contains;
 using testing::ElementsAre;
-using testing::HasSubstr;
 using testing::IsEmpty;
 
 // Executables signed by a certificate authority of the build's own, and that authority's certificate; see
@@ -75,6 +74,7 @@ TEST_F(SignedFiles, ManyThreadsMayAskAtOnceAlsoFirst) {
   CertVerifier verifier;
   std::atomic<int> trusted{0};
   std::vector<std::thread> threads;
+  threads.reserve(4);
   for (int i = 0; i < 4; ++i) {
     threads.emplace_back([&] {
       if (verifier.CertTrustVer((SignedFolder() + L"trusted.exe").c_str(), nullptr)) ++trusted;

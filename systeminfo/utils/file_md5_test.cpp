@@ -10,7 +10,6 @@ namespace systeminfo::utils {
 namespace {
 
 using testing::ElementsAre;
-using testing::HasSubstr;
 
 std::string MakeFile(const TestFolder& folder, std::wstring_view name, std::string_view bytes) {
   return ToUtf8(folder.MakeFile(name, bytes));

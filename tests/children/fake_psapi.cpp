@@ -1,14 +1,10 @@
 // Stands in for psapi.dll: what an old one exports, for a process with very many modules. Built a second time without
 // GetModuleFileNameExW.
-#define PSAPI_VERSION 1  // the exports keep their own names
 #include <windows.h>
-
-#include <psapi.h>
 
 namespace {
 
 constexpr DWORD kModules = 1500;
-constexpr DWORD kNamelessModule = 7;
 
 }  // namespace
 
@@ -24,7 +20,8 @@ __declspec(dllexport) BOOL WINAPI EnumProcessModules(HANDLE, HMODULE* modules, D
 #ifndef ST_WITHOUT_NAMES
 __declspec(dllexport) DWORD WINAPI GetModuleFileNameExW(HANDLE, HMODULE module, LPWSTR name, DWORD size) {
   const auto number = static_cast<DWORD>(reinterpret_cast<ULONG_PTR>(module));
-  if (number == kNamelessModule || size < 2) return 0;
+  // One module has no name.
+  if (number == 7 || size < 2) return 0;
   name[0] = static_cast<wchar_t>(L'a' + number % 26);
   name[1] = L'\0';
   return 1;
