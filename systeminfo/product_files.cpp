@@ -15,15 +15,13 @@
 namespace systeminfo {
 namespace {
 
-Json::Value FileRecord(const std::string& path, const std::string& md5) {
+Json::Value FileRecord(const std::string& path, const std::string& md5, const std::string& version) {
+  if (version.empty()) {
+    LOG_ERROR(L"systeminfo::GetFileInformation", L"Failed to get version for file %s", ToWide(path).c_str());
+  }
   Json::Value record(Json::objectValue);
   record["path"] = path;
   record["md5"] = md5;
-  const std::wstring widePath = ToWide(path);
-  const std::string version = utils::GetFileVersion(widePath);
-  if (version.empty()) {
-    LOG_ERROR(L"systeminfo::GetFileInformation", L"Failed to get version for file %s", widePath.c_str());
-  }
   record["version"] = version;
   return record;
 }
@@ -32,7 +30,7 @@ Json::Value FileRecord(const std::string& path, const std::string& md5) {
 
 Json::Value GetFileInformation(const std::wstring& path) {
   const std::string utf8Path = ToUtf8(path);
-  return FileRecord(utf8Path, utils::GetFileMD5(utf8Path));
+  return FileRecord(utf8Path, utils::GetFileMD5(utf8Path), utils::GetFileVersion(path));
 }
 
 Json::Value GetProductFileInformation(const std::wstring& installFolder, const std::atomic<bool>* cancel) {
@@ -45,10 +43,12 @@ Json::Value GetProductFileInformation(const std::wstring& installFolder, const s
   });
   if (!isWalked) LOG_ERROR(L"systeminfo::GetProductFileInformation", L"WalkDir returned false");
 
-  const std::vector<std::string> digests = utils::GetFileMD5s(paths, cancel);
+  std::vector<std::string> versions(paths.size());  // each element is written by one thread only
+  const std::vector<std::string> digests = utils::GetFileMD5s(
+      paths, cancel, [&versions](size_t index, HANDLE file) { versions[index] = utils::GetFileVersion(file); });
   Json::Value records(Json::arrayValue);
   for (size_t i = 0; i < paths.size() && !IsCancelled(cancel); ++i)
-    records.append(FileRecord(paths[i], digests[i]));
+    records.append(FileRecord(paths[i], digests[i], versions[i]));
   return records;
 }
 

@@ -19,7 +19,9 @@ constexpr size_t kMostThreads = 4;                 // the disk is the limit befo
 // Hashes files one after another, with one buffer and one digest for all of them.
 class FileHasher {
  public:
-  std::string Hash(const std::string& path) {
+  // `visit` (HANDLE ->) is called with the file still open.
+  template <class Visit>
+  std::string Hash(const std::string& path, Visit visit) {
     const KernelHandle file(CreateFileW(ExtendedPath(ToWide(path)).c_str(), GENERIC_READ,
                                         FILE_SHARE_READ | FILE_SHARE_WRITE | FILE_SHARE_DELETE, nullptr, OPEN_EXISTING,
                                         FILE_ATTRIBUTE_NORMAL | FILE_FLAG_SEQUENTIAL_SCAN, nullptr));
@@ -35,6 +37,7 @@ class FileHasher {
     const bool isRead = AddAll(file.Get(), path);
     std::string digest = m_digest.Finish();
     if (!isRead) digest.clear();
+    visit(file.Get());
     return digest;
   }
 
@@ -57,8 +60,8 @@ class FileHasher {
 
 class Batch {
  public:
-  Batch(std::span<const std::string> paths, const std::atomic<bool>* cancel)
-      : m_paths(paths), m_cancel(cancel), m_digests(paths.size()) {}
+  Batch(std::span<const std::string> paths, const std::atomic<bool>* cancel, const FileVisitor& whileOpen)
+      : m_paths(paths), m_cancel(cancel), m_whileOpen(whileOpen), m_digests(paths.size()) {}
 
   std::vector<std::string> Run() {
     const size_t threads = std::min<size_t>({std::thread::hardware_concurrency(), kMostThreads, m_paths.size()});
@@ -81,12 +84,15 @@ class Batch {
     while (m_cancel == nullptr || !m_cancel->load()) {
       const size_t index = m_next++;
       if (index >= m_paths.size()) return;
-      m_digests[index] = hasher.Hash(m_paths[index]);
+      m_digests[index] = hasher.Hash(m_paths[index], [&](HANDLE file) {
+        if (m_whileOpen) m_whileOpen(index, file);
+      });
     }
   }
 
   const std::span<const std::string> m_paths;
   const std::atomic<bool>* const m_cancel;
+  const FileVisitor& m_whileOpen;
   std::atomic<size_t> m_next{0};
   std::vector<std::string> m_digests;  // each element is written by one thread only
 };
@@ -94,11 +100,12 @@ class Batch {
 }  // namespace
 
 std::string GetFileMD5(std::string_view path) {
-  return FileHasher().Hash(std::string(path));
+  return FileHasher().Hash(std::string(path), [](HANDLE) {});
 }
 
-std::vector<std::string> GetFileMD5s(std::span<const std::string> paths, const std::atomic<bool>* cancel) {
-  return Batch(paths, cancel).Run();
+std::vector<std::string> GetFileMD5s(std::span<const std::string> paths, const std::atomic<bool>* cancel,
+                                     const FileVisitor& whileOpen) {
+  return Batch(paths, cancel, whileOpen).Run();
 }
 
 }  // namespace systeminfo::utils

@@ -60,6 +60,17 @@ TEST(FileMd5, BatchKeepsTheOrderAndGoesOnBehindAFailure) {
   EXPECT_EQ(GetFileMD5s(paths), expected);
   EXPECT_THAT(GetFileMD5s({}), ElementsAre());
 
+  std::vector<LONGLONG> sizes(paths.size(), -1);
+  EXPECT_EQ(GetFileMD5s(paths, nullptr,
+                        [&sizes](size_t index, HANDLE file) {
+                          LARGE_INTEGER size{};
+                          GetFileSizeEx(file, &size);
+                          sizes[index] = size.QuadPart;
+                        }),
+            expected);
+  for (size_t i = 0; i < sizes.size(); ++i)
+    EXPECT_EQ(sizes[i], i == 20 ? -1 : static_cast<LONGLONG>(i) * 1000);
+
   const std::atomic<bool> cancelled{true};
   EXPECT_EQ(GetFileMD5s(paths, &cancelled), std::vector<std::string>(paths.size()));
 }

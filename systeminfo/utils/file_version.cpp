@@ -4,7 +4,6 @@
 
 #include <algorithm>
 #include <cstring>
-#include <utility>
 
 #include "core/files.h"
 #include "core/scoped.h"
@@ -16,9 +15,7 @@ namespace {
 // Small pieces of a file, which mostly lie close together.
 class FilePieces {
  public:
-  explicit FilePieces(KernelHandle file) : m_file(std::move(file)) {}
-
-  bool IsOpen() const { return static_cast<bool>(m_file); }
+  explicit FilePieces(HANDLE file) : m_file(file) {}
 
   bool Read(uint64_t offset, size_t size, std::string& bytes) {
     const bool isHeld = offset >= m_offset && offset - m_offset <= m_window.size() &&
@@ -35,11 +32,11 @@ class FilePieces {
     position.QuadPart = static_cast<LONGLONG>(offset);
     m_offset = offset;
     m_window.clear();
-    return SetFilePointerEx(m_file.Get(), position, nullptr, FILE_BEGIN) &&
-           ReadBytes(m_file.Get(), std::max(size, kWindow), m_window) == ERROR_SUCCESS && m_window.size() >= size;
+    return SetFilePointerEx(m_file, position, nullptr, FILE_BEGIN) &&
+           ReadBytes(m_file, std::max(size, kWindow), m_window) == ERROR_SUCCESS && m_window.size() >= size;
   }
 
-  const KernelHandle m_file;
+  const HANDLE m_file;
   uint64_t m_offset = 0;
   std::string m_window;  // the bytes of the file from there on
 };
@@ -61,11 +58,15 @@ std::string FixedInfoVersion(std::string_view fixedInfo) {
 }
 
 std::string GetFileVersion(std::wstring_view path) {
-  FilePieces file(OpenForReading(path));
-  if (!file.IsOpen()) return {};
+  const KernelHandle file = OpenForReading(path);
+  return file ? GetFileVersion(file.Get()) : std::string();
+}
+
+std::string GetFileVersion(HANDLE file) {
+  FilePieces pieces(file);
   SetLastError(ERROR_RESOURCE_DATA_NOT_FOUND);
   return FixedInfoVersion(FindFixedVersionInfo(
-      [&file](uint64_t offset, size_t size, std::string& bytes) { return file.Read(offset, size, bytes); }));
+      [&pieces](uint64_t offset, size_t size, std::string& bytes) { return pieces.Read(offset, size, bytes); }));
 }
 
 }  // namespace systeminfo::utils
