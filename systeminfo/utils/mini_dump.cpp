@@ -3,6 +3,7 @@
 #include <mutex>
 #include <string>
 
+#include "core/dynamic_library.h"
 #include "core/format.h"
 #include "core/lock.h"
 
@@ -51,10 +52,15 @@ BOOL FilterMiniDump(const MiniDumpLog& log, const MINIDUMP_CALLBACK_INPUT* input
 }
 
 DWORD WriteMiniDump(HANDLE process, DWORD processId, HANDLE file, MINIDUMP_CALLBACK_ROUTINE callback) {
+  // Loaded for the first dump, so that runs without one start faster.
+  static const DynamicLibrary library(L"dbghelp.dll");
+  static const auto writeDump = library.Resolve<decltype(&MiniDumpWriteDump)>("MiniDumpWriteDump");
+  if (writeDump == nullptr) return ERROR_PROC_NOT_FOUND;
+
   static SharedLock lock;  // the library serves one thread at a time
   const std::lock_guard guard(lock);
   MINIDUMP_CALLBACK_INFORMATION information{callback, nullptr};
-  if (MiniDumpWriteDump(process, processId, file, kMiniDumpType, nullptr, nullptr, &information)) return ERROR_SUCCESS;
+  if (writeDump(process, processId, file, kMiniDumpType, nullptr, nullptr, &information)) return ERROR_SUCCESS;
   const DWORD error = GetLastError();
   return error == ERROR_SUCCESS ? ERROR_GEN_FAILURE : error;
 }
