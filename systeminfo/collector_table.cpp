@@ -1,5 +1,11 @@
 #include "systeminfo/collector_table.h"
 
+#include "systeminfo/cpu_collector.h"
+#include "systeminfo/disk_collector.h"
+#include "systeminfo/network_connections_collector.h"
+#include "systeminfo/printers_collector.h"
+#include "systeminfo/service_collector.h"
+#include "systeminfo/system_drivers_collector.h"
 #include "systeminfo/system_summary.h"
 
 namespace systeminfo {
@@ -13,6 +19,12 @@ std::shared_ptr<ICollector> Make(std::wstring name) {
 // The only list. A collector that writes the same file as an earlier one replaces it.
 constexpr CollectorRow kCollectors[] = {
     {L"system_summary", L"SystemSummary", &Make<SystemSummary>},
+    {L"processor", L"CpuCollector", &Make<CpuCollector>},
+    {L"storage", L"DiskCollector", &Make<DiskCollector>},
+    {L"printers", L"PrintersCollector", &Make<PrintersCollector>},
+    {L"system_drivers", L"SystemDriversCollector", &Make<SystemDriversCollector>},
+    {L"network", L"NetworkConnectionsCollector", &Make<NetworkConnectionsCollector>},
+    {L"services", L"ServiceCollector", &Make<ServiceCollector>},
 };
 
 }  // namespace
