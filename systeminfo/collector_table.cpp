@@ -2,6 +2,7 @@
 
 #include "systeminfo/cpu_collector.h"
 #include "systeminfo/disk_collector.h"
+#include "systeminfo/network_collector.h"
 #include "systeminfo/network_connections_collector.h"
 #include "systeminfo/printers_collector.h"
 #include "systeminfo/service_collector.h"
@@ -21,6 +22,7 @@ constexpr CollectorRow kCollectors[] = {
     {L"system_summary", L"SystemSummary", &Make<SystemSummary>},
     {L"processor", L"CpuCollector", &Make<CpuCollector>},
     {L"storage", L"DiskCollector", &Make<DiskCollector>},
+    {L"network", L"NetworkCollector", &Make<NetworkCollector>},
     {L"printers", L"PrintersCollector", &Make<PrintersCollector>},
     {L"system_drivers", L"SystemDriversCollector", &Make<SystemDriversCollector>},
     {L"network", L"NetworkConnectionsCollector", &Make<NetworkConnectionsCollector>},
