@@ -2,6 +2,7 @@
 
 #include "systeminfo/cpu_collector.h"
 #include "systeminfo/disk_collector.h"
+#include "systeminfo/installed_updates_collector.h"
 #include "systeminfo/network_collector.h"
 #include "systeminfo/network_connections_collector.h"
 #include "systeminfo/printers_collector.h"
@@ -27,6 +28,7 @@ constexpr CollectorRow kCollectors[] = {
     {L"system_drivers", L"SystemDriversCollector", &Make<SystemDriversCollector>},
     {L"network", L"NetworkConnectionsCollector", &Make<NetworkConnectionsCollector>},
     {L"services", L"ServiceCollector", &Make<ServiceCollector>},
+    {L"installed_updates", L"InstalledUpdatesCollector", &Make<InstalledUpdatesCollector>},
 };
 
 }  // namespace
