@@ -127,6 +127,19 @@ TEST(SystemSummary, BiosModeIsLegacyOnlyForTheReturnValueOne) {
   }
 }
 
+TEST(SystemSummary, OneBatteryMakesALaptopAlsoWhenTheListBreaksOff) {
+  FakeWmi fake;
+  fake_wmi::Answer& batteries = fake.answers[L"SELECT * FROM Win32_Battery"];
+  const auto role = [&fake] { return Collect(std::make_shared<WMIWrapper>(fake.Services()))["Platform Role"]; };
+  batteries.queryStatus = WBEM_E_FAILED;
+  EXPECT_EQ(role(), "Desktop");
+  batteries.queryStatus = WBEM_S_NO_ERROR;
+  batteries.endStatus = WBEM_E_FAILED;
+  EXPECT_EQ(role(), "Desktop");
+  batteries.instances = {{{L"Name", fake_wmi::Failure(WBEM_E_FAILED)}}, {}};
+  EXPECT_EQ(role(), "Laptop") << "a battery without a name is one";
+}
+
 TEST(LocaleName, KnownUnknownAndUnreadableIdentifiers) {
   EXPECT_EQ(LocaleName("0409"), "en-US");
   EXPECT_EQ(LocaleName("0407"), "de-DE");

@@ -92,8 +92,9 @@ int WMIWrapper::VisitInstances(const std::wstring& query, bool onlyFirst, const 
     visit(*instance.Get());
     if (onlyFirst) break;
   }
-  // ExecQuery returns at once, so a query that WMI cannot run at all may fail only in Next.
-  if (FAILED(status)) {
+  // ExecQuery returns at once, so a query that WMI cannot run at all may fail only in Next. A Next that gave up waiting
+  // calls itself a success, but there may be instances behind it.
+  if (FAILED(status) || status == WBEM_S_TIMEDOUT) {
     LOG_ERROR(kExecuteQuery, L"Query %s failed. Error code %x", query.c_str(), static_cast<unsigned>(status));
     return 1;
   }

@@ -82,11 +82,15 @@ TEST_F(WmiQuery, FailureIsLoggedAndKeepsTheRowsBeforeIt) {
   EXPECT_THAT(m_errors.Take(), ElementsAre(L"WMIWrapper::ExecuteQuery: Query Q failed. Error code 80041017"));
 
   m_answer.queryStatus = WBEM_S_NO_ERROR;
-  m_answer.endStatus = WBEM_E_INVALID_CLASS;
   m_answer.instances = {{{L"Name", Text(L"a")}, {L"Size", Number(1)}}};
-  EXPECT_EQ(m_wmi.ExecuteQuery(L"Q", kNames, table), 1);
-  EXPECT_THAT(m_errors.Take(), ElementsAre(L"WMIWrapper::ExecuteQuery: Query Q failed. Error code 80041010"));
-  EXPECT_THAT(table, ElementsAre(ElementsAre("a", 1u)));
+  const std::pair<HRESULT, std::wstring> ends[] = {{WBEM_E_INVALID_CLASS, L"80041010"}, {WBEM_S_TIMEDOUT, L"40004"}};
+  for (const auto& [status, code] : ends) {
+    m_answer.endStatus = status;
+    table.clear();
+    EXPECT_EQ(m_wmi.ExecuteQuery(L"Q", kNames, table), 1);
+    EXPECT_THAT(m_errors.Take(), ElementsAre(L"WMIWrapper::ExecuteQuery: Query Q failed. Error code " + code));
+    EXPECT_THAT(table, ElementsAre(ElementsAre("a", 1u)));
+  }
 }
 
 TEST(WMIWrapper, QueryWithoutConnectionFails) {

@@ -8,6 +8,7 @@ package arrived in the outbox, could be opened, and everything in it is sound. N
 tools/wine_session.sh.
 """
 
+import collections
 import functools
 import json
 import os
@@ -104,8 +105,8 @@ def summary(manifest, package, plain, log, seconds):
     print(f"\n   {'collector':<24}{'outcome':<10}{'records':>9}{'bytes':>12}{'ms':>8}")
     for row in manifest["collectors"]:
         print(f"   {row['name']:<24}{row['outcome']:<10}{row['records']:>9}{row['bytes']:>12,}{row['milliseconds']:>8}")
-        for line in row["errors"]:
-            print(f"      {line}")
+        for line, count in collections.Counter(row["errors"]).items():
+            print(f"      {line}" + (f"  ({count} times)" if count > 1 else ""))
     print(f"\n   archive   {plain.stat().st_size:,} bytes, checked")
     print(f"   package   {package}  ({package.stat().st_size:,} bytes)")
     print(f"   log       {log.path}")

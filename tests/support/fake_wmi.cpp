@@ -80,6 +80,21 @@ Property Number(int32_t number) {
   };
 }
 
+Property Flag(bool flag) {
+  return [flag](VARIANT* value) {
+    value->vt = VT_BOOL;
+    value->boolVal = flag ? VARIANT_TRUE : VARIANT_FALSE;
+    return WBEM_S_NO_ERROR;
+  };
+}
+
+Property Nothing() {
+  return [](VARIANT* value) {
+    value->vt = VT_NULL;
+    return WBEM_S_NO_ERROR;
+  };
+}
+
 Property Failure(HRESULT status) {
   return [status](VARIANT*) { return status; };
 }

@@ -30,6 +30,8 @@ struct Answer {
 
 Property Text(std::wstring text);
 Property Number(int32_t number);  // VT_I4
+Property Flag(bool flag);         // VT_BOOL
+Property Nothing();               // VT_NULL: there is such a property, without a value
 Property Failure(HRESULT status);
 
 }  // namespace fake_wmi
