@@ -72,6 +72,13 @@ struct ModuleTraits {
 };
 using ScopedModule = Scoped<ModuleTraits>;
 
+struct RegistryKeyTraits {
+  using Type = HKEY;
+  static bool IsValid(HKEY key) { return key != nullptr; }
+  static void Close(HKEY key) { RegCloseKey(key); }
+};
+using RegistryKeyHandle = Scoped<RegistryKeyTraits>;
+
 template <class T>
 struct LocalMemoryTraits {
   using Type = T*;
