@@ -1,5 +1,6 @@
 #include "systeminfo/collector_table.h"
 
+#include "systeminfo/event_log_collector.h"
 #include "systeminfo/system_summary.h"
 
 namespace systeminfo {
@@ -13,6 +14,7 @@ std::shared_ptr<ICollector> Make(std::wstring name) {
 // The only list. A collector that writes the same file as an earlier one replaces it.
 constexpr CollectorRow kCollectors[] = {
     {L"system_summary", L"SystemSummary", &Make<SystemSummary>},
+    {L"windows_events", L"EventLogCollector", &Make<EventLogCollector>},
 };
 
 }  // namespace
