@@ -40,19 +40,22 @@ void AppendUtf8(std::string& utf8, uint32_t codepoint) {
   }
 }
 
-// Takes a zero-terminated UTF-16 text at `position`, which moves behind it. False, and nothing taken, when the record
-// ends before the text does.
-bool TakeText(std::string_view record, size_t& position, std::string& utf8) {
-  size_t end = position;
-  while (end + 2 <= record.size() && Get16(record, end) != 0)
-    end += 2;
-  if (end + 2 > record.size()) return false;
-  utf8.clear();
-  utf8.reserve((end - position) / 2);
-  for (; position < end; position += 2) {
-    uint32_t codepoint = Get16(record, position);
+// Half a surrogate pair becomes U+FFFD.
+std::string Utf8(std::string_view utf16) {
+  // Most texts are ASCII from end to end; the general loop takes over where one is not.
+  std::string utf8(utf16.size() / 2, '\0');
+  size_t position = 0;
+  for (char& c : utf8) {
+    const uint16_t unit = Get16(utf16, position);
+    if (unit >= 0x80) break;
+    c = static_cast<char>(unit);
+    position += 2;
+  }
+  utf8.resize(position / 2);
+  for (; position < utf16.size(); position += 2) {
+    uint32_t codepoint = Get16(utf16, position);
     const bool isHigh = (codepoint & 0xFC00) == 0xD800;
-    const uint16_t next = isHigh ? Get16(record, position + 2) : 0;  // at the end it is the terminator
+    const uint16_t next = isHigh && position + 4 <= utf16.size() ? Get16(utf16, position + 2) : 0;
     if ((next & 0xFC00) == 0xDC00) {
       codepoint = 0x10000 + ((codepoint & 0x3FF) << 10 | (next & 0x3FF));
       position += 2;
@@ -61,6 +64,17 @@ bool TakeText(std::string_view record, size_t& position, std::string& utf8) {
     }
     AppendUtf8(utf8, codepoint);
   }
+  return utf8;
+}
+
+// Takes a zero-terminated UTF-16 text at `position`, which moves behind it. False, and nothing taken, when the record
+// ends before the text does.
+bool TakeText(std::string_view record, size_t& position, std::string& utf8) {
+  size_t end = position;
+  while (end + 2 <= record.size() && Get16(record, end) != 0)
+    end += 2;
+  if (end + 2 > record.size()) return false;
+  utf8 = Utf8(record.substr(position, end - position));
   position = end + 2;
   return true;
 }

@@ -184,6 +184,20 @@ def walk(bench):
     yield Line("walk", f"{figures['walk_dir ms']} ms", f"{figures['bare ms']} ms", float(figures["ratio"]), 1.5)
 
 
+def events(bench):
+    def side(job, writer):
+        return bench.ours("events_bench", job, writer, f"{writer}.json")
+
+    yield bench.compare("events", 0.60, side("document", "ours"), side("document", "library"), peer_in_wine=True)
+    with open(f"{FOLDER}/ours.json", "rb") as ours, open(f"{FOLDER}/library.json", "rb") as library:
+        if ours.read() != library.read():
+            raise RuntimeError("the writers do not agree")
+    yield bench.compare("  from the log on", 1, side("records", "ours"), side("records", "library"), peer_in_wine=True)
+    yield bench.peak_over_idle("  memory to write it", 1, side("document", "ours"), side("document", "none"))
+    for writer in ("ours", "library"):
+        remove(f"{FOLDER}/{writer}.json")
+
+
 def start(bench):
     # Without a job the program comes up, writes its first lines and ends: a little more than what the goal is about.
     yield bench.compare("start", 4, bench.ours("support_tool", "nogui"), bench.ours("empty_program"), peer_in_wine=True)
@@ -196,6 +210,7 @@ ROWS = {
     "pack-memory": ("peak memory of packing over an idle run", pack_memory),
     "encrypt": ("RC4 of 50 MiB, file to file, against openssl enc -rc4; its peak memory", encrypt),
     "walk": ("10,000 files, against a bare FindFirstFile loop", walk),
+    "events": ("20,000 event records to a JSON file, against Json::StyledWriter; memory over the document", events),
     "start": ("start, first log lines, end; against an empty GUI program", start),
 }
 
