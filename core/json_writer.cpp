@@ -136,19 +136,26 @@ void ForEachElement(const Json::Value& array, Function each) {
 class JsonText {
  public:
   explicit JsonText(const JsonSink& sink) : m_sink(sink) {}
+  JsonText(const JsonText&) = delete;
+  JsonText& operator=(const JsonText&) = delete;
+
+  void Write(const Json::Value& root) {
+    Put(root);
+    m_text += '\n';
+    PassOn(0);
+  }
 
  protected:
+  ~JsonText() = default;
+
+  virtual void Put(const Json::Value& value) = 0;
+
   // False once the sink has had enough.
   bool PassOn(size_t least = kPiece) {
     if (m_text.size() < least) return m_wanted;
     if (m_wanted) m_wanted = m_sink(m_text);
     m_text.clear();
     return m_wanted;
-  }
-
-  void Finish() {
-    m_text += '\n';
-    PassOn(0);
   }
 
   void PutMemberName(const Json::ValueConstIterator& member) {
@@ -177,17 +184,12 @@ class JsonText {
 
 // NOLINTBEGIN(misc-no-recursion): as deep as the document, which is bounded where it is made
 
-class CompactText : JsonText {
+class CompactText final : public JsonText {
  public:
   using JsonText::JsonText;
 
-  void Write(const Json::Value& root) {
-    Put(root);
-    Finish();
-  }
-
  private:
-  void Put(const Json::Value& value) {
+  void Put(const Json::Value& value) override {
     if (!IsFilledContainer(value)) {
       PutScalarOrEmpty(m_text, value);
     } else if (value.isArray()) {
@@ -215,20 +217,15 @@ class CompactText : JsonText {
   }
 };
 
-class StyledText : JsonText {
+class StyledText final : public JsonText {
  public:
   using JsonText::JsonText;
-
-  void Write(const Json::Value& root) {
-    Put(root);
-    Finish();
-  }
 
  private:
   static constexpr size_t kIndent = 3;
   static constexpr size_t kRightMargin = 74;
 
-  void Put(const Json::Value& value) {
+  void Put(const Json::Value& value) override {
     if (!IsFilledContainer(value)) {
       PutScalarOrEmpty(m_text, value);
     } else if (value.isArray()) {

@@ -15,7 +15,6 @@
 namespace systeminfo {
 namespace {
 
-using event_records::Fields;
 using event_records::Make;
 using testing::AllOf;
 using testing::Contains;
@@ -194,7 +193,8 @@ TEST_F(EventLogCollectorTest, BufferThatCannotGrowEndsTheLogWithWhatWasRead) {
                                                  {0xFFFFFFFF, refused + L"-1 bytes).\n"},
                                                  {0x10000, L"ReadEventLog failed with 122.\n"},
                                                  {0, L"ReadEventLog failed with 122.\n"}};
-  for (const auto& [needed, line] : rows) {
+  for (const auto& row : rows) {
+    const DWORD needed = row.first;
     const Json::Value records = ReadScripted([needed, call = 0](char* buffer, DWORD& read, DWORD& bytesNeeded) mutable {
       const std::string record = Record(1, u"before");
       std::copy(record.begin(), record.end(), buffer);
@@ -203,7 +203,7 @@ TEST_F(EventLogCollectorTest, BufferThatCannotGrowEndsTheLogWithWhatWasRead) {
       return ++call == 1 ? ERROR_SUCCESS : ERROR_INSUFFICIENT_BUFFER;
     });
     EXPECT_THAT(Sources(records), ElementsAre("before")) << needed;
-    EXPECT_THAT(Lines(L"ReadEventLogForSource"), ElementsAre(line)) << needed;
+    EXPECT_THAT(Lines(L"ReadEventLogForSource"), ElementsAre(row.second)) << needed;
   }
 }
 

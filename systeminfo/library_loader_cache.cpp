@@ -107,7 +107,8 @@ std::wstring GetMessageString(HMODULE module, DWORD eventId) {
   const DWORD length =
       FormatMessageW(kFlags, module, eventId, 0, reinterpret_cast<wchar_t*>(text.Receive()), 0, nullptr);
   if (length == 0) {
-    LOG_TRACE(L"systeminfo::GetMessageString", L"Format message failed with %lu", GetLastError());
+    const DWORD error = GetLastError();
+    LOG_TRACE(L"systeminfo::GetMessageString", L"Format message failed with %lu", error);
     return {};
   }
   return {text.Get(), length};

@@ -15,7 +15,6 @@ namespace {
 using testing::Contains;
 using testing::ElementsAre;
 using testing::HasSubstr;
-using testing::IsEmpty;
 
 // Of tests/children/messages.mc.
 constexpr DWORD kInsertions = 0xC000'1000, kTwoLines = 4097, kHostile = 4098;
