@@ -5,21 +5,25 @@
 
 #include "core/scoped.h"
 
+// LoadLibraryExW without the system's "Bad Image" box for a file that is no library for this machine. Null when it
+// fails; the system's last error says why.
+inline ScopedModule LoadLibraryQuietly(const wchar_t* name, DWORD flags) {
+  DWORD oldMode = 0;
+  SetThreadErrorMode(SEM_FAILCRITICALERRORS | SEM_NOOPENFILEERRORBOX, &oldMode);
+  ScopedModule module(LoadLibraryExW(name, nullptr, flags));
+  const DWORD error = GetLastError();
+  SetThreadErrorMode(oldMode, nullptr);
+  SetLastError(error);
+  return module;
+}
+
 class DynamicLibrary {
  public:
   DynamicLibrary() = default;
 
   // `name` is a bare file name (found in the program's and the system's folder only, see RestrictLibrarySearch) or a
   // full path. Check with operator bool; the system's last error says why it failed.
-  explicit DynamicLibrary(const wchar_t* name) {
-    // A file that is no library for this machine must not raise the system's "Bad Image" box.
-    DWORD oldMode = 0;
-    SetThreadErrorMode(SEM_FAILCRITICALERRORS | SEM_NOOPENFILEERRORBOX, &oldMode);
-    m_module.Reset(LoadLibraryW(name));
-    const DWORD error = GetLastError();
-    SetThreadErrorMode(oldMode, nullptr);
-    SetLastError(error);
-  }
+  explicit DynamicLibrary(const wchar_t* name) : m_module(LoadLibraryQuietly(name, 0)) {}
 
   explicit operator bool() const { return static_cast<bool>(m_module); }
   HMODULE Module() const { return m_module.Get(); }

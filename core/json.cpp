@@ -1,12 +1,11 @@
 #include "core/json.h"
 
 #include <json/reader.h>
-#include <json/writer.h>
 
 #include <exception>
 
-// Json::Reader, StyledWriter and FastWriter are marked as deprecated in the library, but they define the layout of the
-// program's files, which people compare and scripts read. The build silences the warning for this file only.
+// Json::Reader is marked as deprecated in the library, but it decides what the program accepts, and its messages are
+// what the log shows. The build silences the warning for this file only.
 
 bool ParseJson(std::string_view text, Json::Value& value, std::string& error) {
   constexpr std::string_view kByteOrderMark = "\xEF\xBB\xBF";
@@ -21,12 +20,4 @@ bool ParseJson(std::string_view text, Json::Value& value, std::string& error) {
   }
   value = Json::Value();
   return false;
-}
-
-std::string WriteStyledJson(const Json::Value& value) {
-  return Json::StyledWriter().write(value);
-}
-
-std::string WriteCompactJson(const Json::Value& value) {
-  return Json::FastWriter().write(value);
 }

@@ -4,6 +4,7 @@
 
 #include <json/value.h>
 
+#include <functional>
 #include <string>
 #include <string_view>
 
@@ -12,5 +13,13 @@
 // the end of the document is not looked at, as the library's reader has it.
 bool ParseJson(std::string_view text, Json::Value& value, std::string& error);
 
+// Two layouts, byte for byte those of the library's StyledWriter and FastWriter, which people compare and scripts read.
+// Comments in `value` are not written.
 std::string WriteStyledJson(const Json::Value& value);   // indented by 3 spaces, right margin 74 columns
 std::string WriteCompactJson(const Json::Value& value);  // one line, ended by a newline
+
+// The same for a document whose text is not to be held in memory. The sink gets the text piece by piece, each about 64
+// KiB (more when one string is longer), and ends the writing by returning false.
+using JsonSink = std::function<bool(std::string_view piece)>;
+void WriteStyledJson(const Json::Value& value, const JsonSink& sink);
+void WriteCompactJson(const Json::Value& value, const JsonSink& sink);

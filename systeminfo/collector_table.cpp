@@ -2,6 +2,7 @@
 
 #include "systeminfo/cpu_collector.h"
 #include "systeminfo/disk_collector.h"
+#include "systeminfo/event_log_collector.h"
 #include "systeminfo/installed_software_collector.h"
 #include "systeminfo/installed_updates_collector.h"
 #include "systeminfo/network_collector.h"
@@ -38,6 +39,7 @@ constexpr CollectorRow kCollectors[] = {
     {L"startup_programs", L"StartupProgramsCollector", &Make<StartupProgramsCollector>},
     {L"installed_software", L"InstalledSoftwareCollector", &Make<InstalledSoftwareCollector>},
     {L"installed_updates", L"InstalledUpdatesCollector", &Make<InstalledUpdatesCollector>},
+    {L"windows_events", L"EventLogCollector", &Make<EventLogCollector>},
     {L"process_dumps", L"ProcessDumpCollector", &Make<ProcessDumpCollector>},
     {L"product_information", L"ProductInformationCollector", &Make<ProductInformationCollector>},
     {L"registry", L"RegistryCollector", &Make<RegistryCollector>},

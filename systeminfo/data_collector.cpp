@@ -189,12 +189,20 @@ int DataCollectorImpl::RunCollectors(const std::atomic<bool>* cancel, const Prog
 
 unsigned long DataCollectorImpl::WriteJsonFile(std::wstring_view path, const Json::Value& value, bool pretty,
                                                uint64_t& bytes) {
-  const std::string text = pretty ? WriteStyledJson(value) : WriteCompactJson(value);
-  const DWORD error = WriteWholeFile(path, std::string_view(text));
+  PartialFile file(path);
+  DWORD error = file.Create();
+  uint64_t written = 0;
+  const JsonSink sink = [&](std::string_view piece) {
+    error = file.Write(piece);
+    written += piece.size();
+    return error == ERROR_SUCCESS;
+  };
+  if (error == ERROR_SUCCESS) pretty ? WriteStyledJson(value, sink) : WriteCompactJson(value, sink);
+  if (error == ERROR_SUCCESS) error = file.Publish();
   if (error != ERROR_SUCCESS) {
     LOG_ERROR(kWriteJsonFile, L"Failed to write %s, error %u", std::wstring(path).c_str(), error);
   } else {
-    bytes = text.size();
+    bytes = written;
   }
   return error;
 }

@@ -211,6 +211,20 @@ def product_files(bench):
     yield bench.compare("product-files", 0.60, ours, ["openssl", "md5", *paths])
 
 
+def events(bench):
+    def side(job, writer):
+        return bench.ours("events_bench", job, writer, f"{writer}.json")
+
+    yield bench.compare("events", 0.60, side("document", "ours"), side("document", "library"), peer_in_wine=True)
+    with open(f"{FOLDER}/ours.json", "rb") as ours, open(f"{FOLDER}/library.json", "rb") as library:
+        if ours.read() != library.read():
+            raise RuntimeError("the writers do not agree")
+    yield bench.compare("  from the log on", 1, side("records", "ours"), side("records", "library"), peer_in_wine=True)
+    yield bench.peak_over_idle("  memory to write it", 1, side("document", "ours"), side("document", "none"))
+    for writer in ("ours", "library"):
+        remove(f"{FOLDER}/{writer}.json")
+
+
 def start(bench):
     # Without a job the program comes up, writes its first lines and ends: a little more than what the goal is about.
     yield bench.compare("start", 4, bench.ours("support_tool", "nogui"), bench.ours("empty_program"), peer_in_wine=True)
@@ -226,6 +240,7 @@ ROWS = {
     "handles": ("500,000 handles of 400 processes by process, against a scan for each; 1/30 is the goal", handles),
     "walk": ("10,000 files, against a bare FindFirstFile loop", walk),
     "product-files": ("version and MD5 of 500 libraries, 400 MB, against openssl md5", product_files),
+    "events": ("20,000 event records to a JSON file, against Json::StyledWriter; memory over the document", events),
     "start": ("start, first log lines, end; against an empty GUI program", start),
 }
 

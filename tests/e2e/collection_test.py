@@ -2,13 +2,15 @@
 
 Result 2, a cancelled run, needs another thread to set the flag; nothing on the command line does.
 """
+import json
 import re
 import subprocess
 import unittest
 import uuid
 
 import open_package
-from support_tool import ONE_COLLECTOR, PRIVATE_KEY, ProgramTest, Stage, read_archive, temporary_folder, windows_path
+from support_tool import (ON_WINDOWS, ONE_COLLECTOR, PRIVATE_KEY, ProgramTest, Stage, read_archive, temporary_folder,
+                          windows_path)
 
 KEEP_ALL = ("nodtf", "noda")
 # As the log prints it, with the option pp.
@@ -73,6 +75,38 @@ class Delivery(ProgramTest):
         log = self.stage.run("silent", "/d")
         self.assertReturnCode(log, 1)
         self.assertEqual(self.stage.path("collected_decrypted.zip").read_bytes(), self.archive().read_bytes())
+
+
+class WindowsEvents(ProgramTest):
+    """The event logs of this machine, whatever is in them. A Wine session's are empty."""
+
+    RECORD = {"TimeGenerated", "EventType", "SourceName", "Computername", "InsertionStrings"}
+
+    def test_settings_file_gets_both_logs_written(self):
+        for pretty in (True, False):
+            with self.subTest(pretty=pretty):
+                self.stage.settings({"windows_events": True, "pretty_print": pretty})
+                log = self.stage.run("silent", "collect", "nocs", *KEEP_ALL)
+                self.assertReturnCode(log, 0)
+                self.assertInOrder(log, "Collecting data for : ['windows_events']", "Free loaded libraries")
+                self.assertNotIn("OpenEventLog failed", log)
+                folder = self.stage.path("collected")
+                text = (folder / "windows_events.json").read_text("ascii")
+                events = json.loads(text)
+                self.assertEqual(list(events), ["Application", "System"])
+                for record in events["Application"] + events["System"]:
+                    self.assertEqual(set(record) - {"message"}, self.RECORD)
+                    self.assertRegex(record["TimeGenerated"], r"^\d{1,2}/\d{1,2}/\d{4} \d\d:\d\d:\d\d$")
+                if not ON_WINDOWS:
+                    self.assertEqual(text, '{\n   "Application" : [],\n   "System" : []\n}\n' if pretty
+                                     else '{"Application":[],"System":[]}\n')
+                manifest = json.loads((folder / "collection_manifest.json").read_text("utf-8"))
+                (entry,) = manifest["collectors"]
+                self.assertEqual((entry["name"], entry["class"], entry["outcome"], entry["errors"]),
+                                 ("windows_events", "EventLogCollector", "data", []))
+                self.assertEqual(entry["records"], len(events["Application"]) + len(events["System"]))
+                self.assertEqual(entry["bytes"], len(text))
+                self.stage.clear()
 
 
 class CleanUp(ProgramTest):
