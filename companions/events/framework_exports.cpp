@@ -23,6 +23,11 @@ int32_t QxCreateObject(const wchar_t* name, uint32_t interfaceId, void** object)
   if (interfaceId != EVENT_QUEUE_INTERFACE_1) return EVENT_QUEUE_UNKNOWN_INTERFACE;
   try {
     auto made = std::make_unique<events::PeriodicQueue>();
+    if (const DWORD error = made->Prepare(); error != ERROR_SUCCESS) {
+      made.reset();
+      SetLastError(error);
+      return EVENT_QUEUE_SYSTEM_ERROR;
+    }
     const std::lock_guard lock(g_lock);
     g_living.push_back(made.get());
     *object = static_cast<EventQueue*>(made.release());  // QxDestroyObject takes it back

@@ -1,14 +1,20 @@
 #include "companions/events/periodic_queue.h"
 
 #include <algorithm>
-#include <mutex>
-#include <new>
 #include <utility>
+
+#include "companions/events/beat.h"
 
 namespace events {
 namespace {
 
-constexpr wchar_t kScheduleScope[] = L"GlobalEventQueue::SchedulePeriodic";
+// What is due this soon is run now rather than have the timer set for it: with many items the timer, which is dear,
+// comes at most once in this time.
+constexpr int64_t kSlack = Ticks(std::chrono::microseconds(500)).count();
+
+int64_t Now() {
+  return std::chrono::duration_cast<Ticks>(std::chrono::steady_clock::now().time_since_epoch()).count();
+}
 
 bool IsValid(const EventQueueItem* item) {
   return item != nullptr && item->size >= sizeof(EventQueueItem) && item->period_ms > 0 &&
@@ -31,70 +37,167 @@ int32_t OnCancel(EventQueue* queue, EventQueueHandle handle) {
                           : static_cast<PeriodicQueue*>(queue)->Remove(handle);
 }
 
+// Without the lock.
+void Call(WorkItem& item, EventQueueRun callback) noexcept {
+  if (callback == nullptr) return;
+  try {
+    callback(item.user, item.handle);
+  } catch (...) {
+    if (!std::exchange(item.hasThrown, true)) {
+      LOG_ERROR(L"GlobalEventQueue::Call", L"a callback of '%s' threw; more of that is not logged",
+                item.subscriber.c_str());
+    }
+  }
+}
+
 }  // namespace
 
 PeriodicQueue::PeriodicQueue() : EventQueue{&OnSchedulePeriodic, &OnCancel} {}
 
 PeriodicQueue::~PeriodicQueue() {
-  Items items;
-  {
-    const std::lock_guard lock(m_lock);
-    m_isClosing = true;
-    items.swap(m_items);
-    for (const auto& [handle, item] : items)
-      item->End(WorkItem::FinishedBy::kCaller);
-  }
+  Lock lock(m_lock);
+  m_isClosing = true;
+  m_due.clear();
+  Items items = std::move(m_items);
+  m_items.clear();
   for (const auto& [handle, item] : items)
-    item->Finish();
-  m_ending.clear();  // nothing adds to it any more; waits
+    item->hasEnded = true;
+  for (const auto& [handle, item] : items) {
+    WaitForRun(*item);
+    lock.unlock();
+    Call(*item, item->finished);
+    lock.lock();
+  }
+  while (!m_ending.empty())
+    m_lock.Wait(m_ended);
+}
+
+DWORD PeriodicQueue::Prepare() {
+  TP_CALLBACK_ENVIRON environment;
+  InitializeThreadpoolEnvironment(&environment);
+  SetThreadpoolCallbackRunsLong(&environment);
+  DWORD error = ERROR_SUCCESS;
+  m_timer.Reset(CreateThreadpoolTimer(&PeriodicQueue::OnTimer, this, &environment));
+  if (m_timer) m_work.Reset(CreateThreadpoolWork(&PeriodicQueue::OnWork, this, &environment));
+  if (!m_work) error = GetLastError();
+  DestroyThreadpoolEnvironment(&environment);
+  if (error != ERROR_SUCCESS)
+    LOG_ERROR(L"GlobalEventQueue::Prepare", L"the thread pool makes no timer, error %u", error);
+  return error;
 }
 
 int32_t PeriodicQueue::Add(const EventQueueItem& item, EventQueueHandle& handle) {
-  auto made = std::make_unique<WorkItem>(item);
-  if (!made->Prepare()) {
-    const DWORD error = GetLastError();
-    LOG_ERROR(kScheduleScope, L"no timer for an item of '%s', error %u", item.subscriber, error);
-    SetLastError(error);
-    return EVENT_QUEUE_SYSTEM_ERROR;
-  }
-  Items finished;  // before the lock: destroyed without it
   const std::lock_guard lock(m_lock);
   if (m_isClosing) return EVENT_QUEUE_CLOSING;
-  finished = TakeFinished();
-  WorkItem& added = *m_items.emplace(m_lastHandle + 1, std::move(made)).first->second;
+  auto made = std::make_unique<WorkItem>(item, m_lastHandle + 1);
+  const int64_t now = Now();
+  made->due = now + made->period;
+  DueItems due{made.get()};
+  m_items.emplace(made->handle, std::move(made));
+  m_due.merge(due);  // takes the node over: nothing can fail
   handle = ++m_lastHandle;
-  added.Start(handle);
+  SendForNext(now);
   return EVENT_QUEUE_OK;
 }
 
 int32_t PeriodicQueue::Remove(EventQueueHandle handle) noexcept {
-  Items::node_type node;
-  Waiter waiter{GetCurrentThreadId(), nullptr, nullptr};
-  {
-    const std::lock_guard lock(m_lock);
-    node = m_items.extract(handle);
-    if (node.empty()) return EVENT_QUEUE_UNKNOWN_ITEM;
-    WorkItem& item = *node.mapped();
-    if (WouldWaitForItself(item)) {
-      const bool isOwn = item.RunningThread() == waiter.thread;
-      item.End(WorkItem::FinishedBy::kOwnThread);
-      m_ending.insert(std::move(node));  // moves the node: nothing to fail
-      return isOwn ? EVENT_QUEUE_OK : EVENT_QUEUE_STILL_RUNNING;
-    }
-    item.End(WorkItem::FinishedBy::kCaller);
-    waiter.item = &item;
-    waiter.next = std::exchange(m_waiters, &waiter);
+  Lock lock(m_lock);
+  Items::node_type node = m_items.extract(handle);
+  if (node.empty()) return EVENT_QUEUE_UNKNOWN_ITEM;
+  WorkItem& item = *node.mapped();
+  item.hasEnded = true;
+  if (item.runningThread == 0) m_due.erase(&item);
+  Waiter waiter{GetCurrentThreadId(), &item, m_waiters};
+  if (WouldWaitForItself(item)) {
+    item.finishesItself = true;
+    m_ending.insert(std::move(node));  // takes the node over: nothing can fail
+    return item.runningThread == waiter.thread ? EVENT_QUEUE_OK : EVENT_QUEUE_STILL_RUNNING;
   }
-  node.mapped()->Finish();
-  RemoveWaiter(waiter);
+  m_waiters = &waiter;
+  WaitForRun(item);
+  lock.unlock();
+  Call(item, item.finished);
+  lock.lock();
+  Waiter** link = &m_waiters;
+  while (*link != &waiter)
+    link = &(*link)->next;
+  *link = waiter.next;
   return EVENT_QUEUE_OK;
+}
+
+void CALLBACK PeriodicQueue::OnTimer(PTP_CALLBACK_INSTANCE, void* context, PTP_TIMER) {
+  auto& self = *static_cast<PeriodicQueue*>(context);
+  Lock lock(self.m_lock);
+  self.m_timerDue = kNever;
+  self.RunWhatIsDue(lock);
+}
+
+void CALLBACK PeriodicQueue::OnWork(PTP_CALLBACK_INSTANCE, void* context, PTP_WORK) {
+  auto& self = *static_cast<PeriodicQueue*>(context);
+  Lock lock(self.m_lock);
+  self.m_isThreadUnderWay = false;
+  self.RunWhatIsDue(lock);
+}
+
+void PeriodicQueue::RunWhatIsDue(Lock& lock) {
+  int64_t now = Now();
+  while (!m_due.empty() && (*m_due.begin())->due <= now + kSlack) {
+    RunFirst(lock, now);
+    now = Now();
+  }
+  SendForNext(now);
+}
+
+// Sees to it that a thread will come for what is due first, whatever the calling one is about to do.
+void PeriodicQueue::SendForNext(int64_t now) {
+  if (m_due.empty()) return;
+  const int64_t due = (*m_due.begin())->due;
+  if (due <= now + kSlack) {
+    if (!std::exchange(m_isThreadUnderWay, true)) SubmitThreadpoolWork(m_work.Get());
+    return;
+  }
+  if (due >= m_timerDue) return;
+  m_timerDue = due;
+  ULARGE_INTEGER relative;
+  relative.QuadPart = static_cast<ULONGLONG>(now - due);  // negative: from now
+  FILETIME time{relative.LowPart, relative.HighPart};
+  SetThreadpoolTimer(m_timer.Get(), &time, 0, 0);
+}
+
+void PeriodicQueue::RunFirst(Lock& lock, int64_t now) {
+  DueItems::node_type node = m_due.extract(m_due.begin());
+  WorkItem& item = *node.value();
+  item.runningThread = GetCurrentThreadId();
+  SendForNext(now);
+  lock.unlock();
+  Call(item, item.run);
+  lock.lock();
+  if (!item.hasEnded) {
+    item.runningThread = 0;
+    item.due = NextDue(item.due, item.period, Now());
+    m_due.insert(std::move(node));  // takes the node over: nothing can fail
+  } else if (item.finishesItself) {
+    lock.unlock();
+    Call(item, item.finished);
+    lock.lock();
+    m_ending.erase(item.handle);
+    WakeAllConditionVariable(&m_ended);
+  } else {
+    item.runningThread = 0;
+    WakeAllConditionVariable(&m_ended);
+  }
+}
+
+void PeriodicQueue::WaitForRun(const WorkItem& item) {
+  while (item.runningThread != 0)
+    m_lock.Wait(m_ended);
 }
 
 // Follows who waits for whom, from the thread that runs the item to the calling thread.
 bool PeriodicQueue::WouldWaitForItself(const WorkItem& item) const {
   const DWORD self = GetCurrentThreadId();
   for (const WorkItem* next = &item; next != nullptr;) {
-    const DWORD thread = next->RunningThread();
+    const DWORD thread = next->runningThread;
     if (thread == 0) return false;
     if (thread == self) return true;
     const Waiter* waiter = m_waiters;
@@ -105,32 +208,14 @@ bool PeriodicQueue::WouldWaitForItself(const WorkItem& item) const {
   return false;
 }
 
-void PeriodicQueue::RemoveWaiter(const Waiter& waiter) {
-  const std::lock_guard lock(m_lock);
-  Waiter** link = &m_waiters;
-  while (*link != &waiter)
-    link = &(*link)->next;
-  *link = waiter.next;
-}
-
-// Takes what has ended on its own thread out of the queue. To be destroyed outside m_lock, for that waits.
-PeriodicQueue::Items PeriodicQueue::TakeFinished() {
-  Items finished;
-  for (auto next = m_ending.begin(); next != m_ending.end();) {
-    const auto item = next++;
-    if (item->second->HasFinished()) finished.insert(m_ending.extract(item));
-  }
-  return finished;
-}
-
 bool PeriodicQueue::IsInsideCallback() const {
   const DWORD self = GetCurrentThreadId();
   const std::lock_guard lock(m_lock);
-  const auto isRunByThis = [self](const auto& entry) { return entry.second->RunningThread() == self; };
+  const auto isRunByThis = [self](const auto& entry) { return entry.second->runningThread == self; };
   if (std::any_of(m_items.begin(), m_items.end(), isRunByThis)) return true;
   if (std::any_of(m_ending.begin(), m_ending.end(), isRunByThis)) return true;
   for (const Waiter* waiter = m_waiters; waiter != nullptr; waiter = waiter->next) {
-    if (waiter->thread == self || waiter->item->RunningThread() == self) return true;
+    if (waiter->thread == self || waiter->item->runningThread == self) return true;
   }
   return false;
 }
