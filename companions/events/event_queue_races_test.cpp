@@ -111,6 +111,7 @@ TEST_F(EventQueueTest, OfManyCancelsOneSucceedsAndNothingRunsAfterIt) {
     subscriber.onFinished = [&](EventQueueHandle) { isOver = true; };
     ASSERT_EQ(Schedule(subscriber, 1), EVENT_QUEUE_OK);
     std::vector<std::thread> threads;
+    threads.reserve(3);
     for (int i = 0; i < 3; ++i) {
       threads.emplace_back([&] {
         while (!go)

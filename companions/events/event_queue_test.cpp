@@ -33,6 +33,7 @@ TEST_F(EventQueueTest, FirstRunComesAfterOnePeriodAndTheOthersOnItsBeat) {
 
   EXPECT_GT(times.front(), kPeriod - 5.0);
   std::vector<double> off;  // how far from the nearest beat
+  off.reserve(times.size());
   for (const double time : times)
     off.push_back(std::abs(std::remainder(time, kPeriod)));
   std::nth_element(off.begin(), off.begin() + 10, off.end());

@@ -120,6 +120,7 @@ bool MeasureThreads(const Plan& plan) {
   std::atomic<bool> isOver{false};
   const Meter meter;
   std::vector<std::thread> threads;
+  threads.reserve(all.size());
   for (Times& times : all) {
     threads.emplace_back([&] {
       for (Clock::time_point due = Clock::now(); !isOver;) {
