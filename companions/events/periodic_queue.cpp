@@ -68,8 +68,7 @@ PeriodicQueue::~PeriodicQueue() {
     Call(*item, item->finished);
     lock.lock();
   }
-  while (!m_ending.empty())
-    m_lock.Wait(m_ended);
+  // Those that finish themselves do so in a callback that closing m_work and m_timer waits for.
 }
 
 DWORD PeriodicQueue::Prepare() {
