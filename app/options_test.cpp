@@ -92,6 +92,7 @@ TEST(CommandLineWarnings, NameTheNearestKnownOption) {
       {L"colect", L"'collect'"},
       {L"--outt=x", L"'out'"},
       {L"prettyprint", L"'prettyPrint'"},
+      {L"--dft", L"'dtf'"},
       {L"=v", L"it has no name"},
       {L"o=a\nb", L"its value has a line break"},
       {L"--encrypt=false", L"option 'encrypt' takes no value; 'false' is ignored"},

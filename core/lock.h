@@ -16,6 +16,9 @@ class SharedLock {
   void lock_shared() { AcquireSRWLockShared(&m_lock); }
   void unlock_shared() { ReleaseSRWLockShared(&m_lock); }
 
+  // Gives the lock, held exclusively, up until the condition is signalled; may return without that.
+  void Wait(CONDITION_VARIABLE& condition) { SleepConditionVariableSRW(&condition, &m_lock, INFINITE, 0); }
+
  private:
   SRWLOCK m_lock = SRWLOCK_INIT;
 };

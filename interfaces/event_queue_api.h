@@ -43,12 +43,13 @@ typedef enum EventQueueResult {
 // A work item as long as it is scheduled. Never 0, and never given out twice by one queue.
 typedef uint64_t EventQueueHandle;
 
-// Both are called on a thread of the pool, with no lock held, and may block. What they throw ends there: the item goes
-// on, and the first such run of an item is logged. Hardware faults are not caught: they are for the crash handler.
+// Both are called with no lock held and may block. What they throw ends there: the item goes on, and the first time is
+// logged. Hardware faults are not caught: they are for the crash handler.
 //
-// `run` is called once a period, first one period after scheduling. An item never overlaps itself: a run that takes
-// longer than the period leaves out the ticks that it missed, and the item stays on its beat. Different items run at
-// the same time.
+// `run` is called on a thread of the pool once a period, first one period after scheduling, within about a millisecond
+// where a period is shorter than 100 ms and within a tick of the system's timer (16 ms) where it is not. An item never
+// overlaps itself: a run that takes longer than the period leaves out the ticks that it missed, and the item stays on
+// its beat. Different items run at the same time, as many as the pool has threads.
 //
 // `finished` is called exactly once for each item that was scheduled, after its last run, when it was cancelled or its
 // queue destroyed; `user` may be freed then. It runs on the thread that cancelled or destroyed, before that call
@@ -75,8 +76,9 @@ struct EventQueue {
 
   // No further run begins. Waits for a run that is under way, so that when it returns EVENT_QUEUE_OK the callbacks are
   // done, with one exception: called from the item's own run it returns EVENT_QUEUE_OK at once, and `finished` follows
-  // that run. Of two items whose runs cancel each other at the same time, the second would wait for ever: it returns
-  // EVENT_QUEUE_STILL_RUNNING instead. An item that another thread is just cancelling is EVENT_QUEUE_UNKNOWN_ITEM.
+  // that run. Of two items of a queue whose runs cancel each other at the same time, the second would wait for ever: it
+  // returns EVENT_QUEUE_STILL_RUNNING instead. An item that another thread is just cancelling is
+  // EVENT_QUEUE_UNKNOWN_ITEM.
   int32_t (*Cancel)(EventQueue* queue, EventQueueHandle handle);
 };
 

@@ -47,31 +47,35 @@ WMIWrapper::~WMIWrapper() {
 }
 
 int WMIWrapper::Init() {
+  if (Connect()) return 0;
+  m_services.Reset();
+  m_locator.Reset();
+  return 1;
+}
+
+bool WMIWrapper::Connect() {
   if (!Succeeded(CoInitializeEx(nullptr, COINIT_MULTITHREADED), L"Failed to initialize COM library. Error code = %x")) {
-    return 1;
+    return false;
   }
-  if (!Succeeded(CoInitializeSecurity(nullptr, -1, nullptr, nullptr, RPC_C_AUTHN_LEVEL_DEFAULT,
+  if (!Succeeded(m_initializeSecurity(nullptr, -1, nullptr, nullptr, RPC_C_AUTHN_LEVEL_DEFAULT,
                                       RPC_C_IMP_LEVEL_IMPERSONATE, nullptr, EOAC_NONE, nullptr),
                  L"Failed to initialize security. Error code = %x")) {
-    return 1;
+    return false;
   }
   if (!Succeeded(
           CoCreateInstance(CLSID_WbemLocator, nullptr, CLSCTX_INPROC_SERVER, IID_IWbemLocator, m_locator.ReceiveVoid()),
           L"Failed to create IWbemLocator object. Err code = %x")) {
-    return 1;
+    return false;
   }
   const ScopedBstr space = MakeBstr(L"ROOT\\CIMV2");
   if (!Succeeded(
           m_locator->ConnectServer(space.Get(), nullptr, nullptr, nullptr, 0, nullptr, nullptr, m_services.Receive()),
           L"Coult not connect to server. Error code = %x")) {
-    return 1;
+    return false;
   }
-  if (!Succeeded(CoSetProxyBlanket(m_services.Get(), RPC_C_AUTHN_WINNT, RPC_C_AUTHZ_NONE, nullptr,
-                                   RPC_C_AUTHN_LEVEL_CALL, RPC_C_IMP_LEVEL_IMPERSONATE, nullptr, EOAC_NONE),
-                 L"Could not set proxy blanket. Error code = %x")) {
-    return 1;
-  }
-  return 0;
+  return Succeeded(CoSetProxyBlanket(m_services.Get(), RPC_C_AUTHN_WINNT, RPC_C_AUTHZ_NONE, nullptr,
+                                     RPC_C_AUTHN_LEVEL_CALL, RPC_C_IMP_LEVEL_IMPERSONATE, nullptr, EOAC_NONE),
+                   L"Could not set proxy blanket. Error code = %x");
 }
 
 int WMIWrapper::VisitInstances(const std::wstring& query, bool onlyFirst, const InstanceVisitor& visit) {

@@ -23,7 +23,12 @@ class WMIWrapper {
   using Rows = std::vector<Row>;
   using Table = std::vector<std::vector<Json::Value>>;  // values in the order of the names
 
-  WMIWrapper() = default;
+  // How Init sets the security of the process. A process does that once and never goes back, so tests hand in their
+  // own.
+  using InitializeSecurity = decltype(&CoInitializeSecurity);
+
+  explicit WMIWrapper(InitializeSecurity initializeSecurity = &CoInitializeSecurity)
+      : m_initializeSecurity(initializeSecurity) {}
 
   // Queries go to `services`, and Init is not called.
   explicit WMIWrapper(ComPtr<IWbemServices> services) : m_services(std::move(services)) {}
@@ -34,7 +39,7 @@ class WMIWrapper {
   WMIWrapper& operator=(const WMIWrapper&) = delete;
 
   // Enters the multithreaded apartment, sets the security of the process and connects. 0 on success, 1 on failure, also
-  // when the process had set its security before.
+  // when the process had set its security before; every query fails then.
   int Init();
 
   // The three forms return 0 on success, also when nothing matched, and 1 when the query failed. A failure on the way
@@ -49,9 +54,12 @@ class WMIWrapper {
   Names PropertiesOf(const std::wstring& className, const Names& names);
 
  private:
+  bool Connect();
+
   using InstanceVisitor = std::function<void(IWbemClassObject& instance)>;
   int VisitInstances(const std::wstring& query, bool onlyFirst, const InstanceVisitor& visit);
 
+  InitializeSecurity m_initializeSecurity = &CoInitializeSecurity;
   ComPtr<IWbemLocator> m_locator;
   ComPtr<IWbemServices> m_services;
 };

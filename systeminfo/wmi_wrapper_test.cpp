@@ -5,7 +5,9 @@
 #include <thread>
 
 #include "core/logging.h"
+#include "core/scope_exit.h"
 #include "tests/support/fake_wmi.h"
+#include "tests/support/wmi_stubs.h"
 
 namespace {
 
@@ -109,6 +111,105 @@ TEST(WMIWrapper, ThreadThatIsInAnotherApartmentCannotConnect) {
     EXPECT_EQ(wmi.Init(), 1);
   }).join();
   EXPECT_THAT(errors.Take(), ElementsAre(L"WMIWrapper::Init: Failed to initialize COM library. Error code = 80010106"));
+}
+
+// How far a connection gets. What is not said to fail succeeds, but for the last step: no fake is a proxy.
+struct Connection {
+  HRESULT security = S_OK;
+  HRESULT create = S_OK;
+  HRESULT connect = S_OK;
+};
+
+class FakeLocator : public CountedObject<IWbemLocator> {
+ public:
+  FakeLocator(FakeWmi& wmi, HRESULT status) : m_wmi(wmi), m_status(status) {}
+
+  HRESULT STDMETHODCALLTYPE ConnectServer(const BSTR space, const BSTR, const BSTR, const BSTR, LONG, const BSTR,
+                                          IWbemContext*, IWbemServices** services) override {
+    EXPECT_STREQ(space, L"ROOT\\CIMV2");
+    if (SUCCEEDED(m_status)) *services = m_wmi.Services().Release();
+    return m_status;
+  }
+
+ private:
+  FakeWmi& m_wmi;
+  const HRESULT m_status;
+};
+
+// What the thread's apartment makes locators with while one is registered.
+class FakeLocatorFactory : public CountedObject<IClassFactory> {
+ public:
+  FakeLocatorFactory(FakeWmi& wmi, const Connection& connection) : m_wmi(wmi), m_connection(connection) {}
+
+  HRESULT STDMETHODCALLTYPE QueryInterface(REFIID id, void** object) override {
+    if (id != IID_IUnknown && id != IID_IClassFactory) return CountedObject::QueryInterface(id, object);
+    AddRef();
+    *object = static_cast<IClassFactory*>(this);
+    return S_OK;
+  }
+  HRESULT STDMETHODCALLTYPE CreateInstance(IUnknown*, REFIID, void** object) override {
+    *object = nullptr;
+    if (SUCCEEDED(m_connection.create)) {
+      *object = static_cast<IWbemLocator*>(new FakeLocator(m_wmi, m_connection.connect));
+    }
+    return m_connection.create;
+  }
+  HRESULT STDMETHODCALLTYPE LockServer(BOOL) override { return S_OK; }
+
+ private:
+  FakeWmi& m_wmi;
+  const Connection m_connection;
+};
+
+template <HRESULT status>
+HRESULT WINAPI SecurityThatReturns(PSECURITY_DESCRIPTOR, LONG, SOLE_AUTHENTICATION_SERVICE*, void*, DWORD, DWORD, void*,
+                                   DWORD, void*) {
+  return status;
+}
+
+// On a thread that is in the multithreaded apartment.
+void ExpectFailedInit(FakeWmi& wmi, const Connection& connection, const std::wstring& line) {
+  const ComPtr<IClassFactory> factory(new FakeLocatorFactory(wmi, connection));
+  DWORD registration = 0;
+  ASSERT_EQ(
+      CoRegisterClassObject(CLSID_WbemLocator, factory.Get(), CLSCTX_INPROC_SERVER, REGCLS_MULTIPLEUSE, &registration),
+      S_OK);
+  const ScopeExit revoke([registration] { CoRevokeClassObject(registration); });
+  logging::ErrorCapture errors;
+  WMIWrapper wrapper(SUCCEEDED(connection.security) ? &SecurityThatReturns<S_OK>
+                                                    : &SecurityThatReturns<RPC_E_TOO_LATE>);
+  EXPECT_EQ(wrapper.Init(), 1);
+  EXPECT_THAT(errors.Take(), ElementsAre(L"WMIWrapper::Init: " + line));
+  EXPECT_EQ(FakeLocator::Live(), 0) << "the locator is kept";
+  EXPECT_EQ(WbemServicesStub::Live(), 0) << "the connection is kept";
+
+  WMIWrapper::Rows rows;
+  EXPECT_EQ(wrapper.ExecuteQuery(L"Q", kNames, rows), 1);
+  EXPECT_THAT(errors.Take(), ElementsAre(L"WMIWrapper::ExecuteQuery: Invalid pSvc pointer; query Q"));
+  EXPECT_THAT(wmi.queries, IsEmpty());
+}
+
+TEST(WMIWrapper, InitThatFailsIsLoggedOnceAndKeepsNothing) {
+  const struct {
+    Connection connection;
+    const wchar_t* line;
+  } rows[] = {
+      {{RPC_E_TOO_LATE, S_OK, S_OK}, L"Failed to initialize security. Error code = 80010119"},
+      {{S_OK, REGDB_E_CLASSNOTREG, S_OK}, L"Failed to create IWbemLocator object. Err code = 80040154"},
+      {{S_OK, S_OK, E_ACCESSDENIED}, L"Coult not connect to server. Error code = 80070005"},
+      {{S_OK, S_OK, S_OK}, L"Could not set proxy blanket. Error code = 80004002"},
+  };
+  for (const auto& row : rows) {
+    std::thread([&row] {
+      ASSERT_EQ(CoInitializeEx(nullptr, COINIT_MULTITHREADED), S_OK);
+      FakeWmi wmi;
+      ExpectFailedInit(wmi, row.connection, row.line);
+      CoUninitialize();
+      APTTYPE type{};
+      APTTYPEQUALIFIER qualifier{};
+      EXPECT_EQ(CoGetApartmentType(&type, &qualifier), CO_E_NOTINITIALIZED) << "the wrapper has left COM";
+    }).join();
+  }
 }
 
 TEST(WMIWrapper, LiveQueriesReturnTheMachinesOwnData) {
