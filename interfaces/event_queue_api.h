@@ -75,8 +75,9 @@ struct EventQueue {
 
   // No further run begins. Waits for a run that is under way, so that when it returns EVENT_QUEUE_OK the callbacks are
   // done, with one exception: called from the item's own run it returns EVENT_QUEUE_OK at once, and `finished` follows
-  // that run. Of two items whose runs cancel each other at the same time, the second would wait for ever: it returns
-  // EVENT_QUEUE_STILL_RUNNING instead. An item that another thread is just cancelling is EVENT_QUEUE_UNKNOWN_ITEM.
+  // that run. Of two items of a queue whose runs cancel each other at the same time, the second would wait for ever: it
+  // returns EVENT_QUEUE_STILL_RUNNING instead. An item that another thread is just cancelling is
+  // EVENT_QUEUE_UNKNOWN_ITEM.
   int32_t (*Cancel)(EventQueue* queue, EventQueueHandle handle);
 };
 
