@@ -11,11 +11,12 @@ class DynamicLibrary {
 
   // `name` is a bare file name (found in the program's and the system's folder only, see RestrictLibrarySearch) or a
   // full path. Check with operator bool; the system's last error says why it failed.
-  explicit DynamicLibrary(const wchar_t* name) {
+  // `flags` are those of LoadLibraryEx.
+  explicit DynamicLibrary(const wchar_t* name, DWORD flags = 0) {
     // A file that is no library for this machine must not raise the system's "Bad Image" box.
     DWORD oldMode = 0;
     SetThreadErrorMode(SEM_FAILCRITICALERRORS | SEM_NOOPENFILEERRORBOX, &oldMode);
-    m_module.Reset(LoadLibraryW(name));
+    m_module.Reset(LoadLibraryExW(name, nullptr, flags));
     const DWORD error = GetLastError();
     SetThreadErrorMode(oldMode, nullptr);
     SetLastError(error);
