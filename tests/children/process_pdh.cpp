@@ -4,18 +4,19 @@
 
 #include <pdh.h>
 #include <pdhmsg.h>
-#include <tlhelp32.h>
+#include <winternl.h>
 
+#include <cstddef>
 #include <memory>
 #include <string>
-
-#include "core/scoped.h"
+#include <string_view>
+#include <vector>
 
 namespace {
 
 constexpr std::wstring_view kBegin = L"\\Process(";
 constexpr std::wstring_view kEnd = L")\\% Processor Time";
-constexpr DWORD kCollecting = 20;  // milliseconds; the system's own counters of processes take about as long
+constexpr DWORD kCollecting = 50;  // milliseconds; the system's own counters of processes take their time, too
 
 struct Sample {
   DWORD processId = 0;           // 0: there is no such process
@@ -31,25 +32,42 @@ ULONGLONG Ticks(const FILETIME& time) {
   return (static_cast<ULONGLONG>(time.dwHighDateTime) << 32) | time.dwLowDateTime;
 }
 
-DWORD FindProcess(const std::wstring& program) {
-  const KernelHandle snapshot(CreateToolhelp32Snapshot(TH32CS_SNAPPROCESS, 0));
-  PROCESSENTRY32W entry{};
-  entry.dwSize = sizeof entry;
-  for (BOOL more = Process32FirstW(snapshot.Get(), &entry); more; more = Process32NextW(snapshot.Get(), &entry)) {
-    if (program == entry.szExeFile) return entry.th32ProcessID;
+// The beginning of an entry of the system's process list, which the header does not spell out.
+struct ProcessEntry {
+  ULONG nextOffset;  // 0: the last one
+  ULONG threads;
+  LARGE_INTEGER reserved[3];
+  LARGE_INTEGER created, user, kernel;  // in 100 ns
+  UNICODE_STRING program;
+  ULONG priority;
+  HANDLE processId;
+};
+
+std::vector<std::byte> ProcessList() {
+  std::vector<std::byte> list(size_t{1} << 16);
+  ULONG size = 0;
+  while (NtQuerySystemInformation(SystemProcessInformation, list.data(), static_cast<ULONG>(list.size()), &size) < 0) {
+    if (list.size() > size_t{1} << 26) return {};
+    list.resize(list.size() * 2);
   }
-  return 0;
+  return list;
 }
 
 Sample TakeSample(const std::wstring& program) {
   Sleep(kCollecting);
-  Sample sample;
-  const DWORD id = FindProcess(program);
-  const KernelHandle process(OpenProcess(PROCESS_QUERY_LIMITED_INFORMATION, FALSE, id));
-  FILETIME created, ended, kernel, user, now;
-  if (id == 0 || !process || !GetProcessTimes(process.Get(), &created, &ended, &kernel, &user)) return sample;
+  const std::vector<std::byte> list = ProcessList();
+  FILETIME now;
   GetSystemTimePreciseAsFileTime(&now);
-  return {id, Ticks(now), Ticks(kernel) + Ticks(user)};
+  for (size_t offset = 0; offset + sizeof(ProcessEntry) <= list.size();) {
+    const auto& entry = *reinterpret_cast<const ProcessEntry*>(list.data() + offset);
+    if (program == std::wstring_view(entry.program.Buffer, entry.program.Length / sizeof(wchar_t))) {
+      return {static_cast<DWORD>(reinterpret_cast<ULONG_PTR>(entry.processId)), Ticks(now),
+              static_cast<ULONGLONG>(entry.user.QuadPart + entry.kernel.QuadPart)};
+    }
+    if (entry.nextOffset == 0) break;
+    offset += entry.nextOffset;
+  }
+  return {};
 }
 
 }  // namespace
