@@ -17,7 +17,6 @@ namespace {
 using testing::ElementsAre;
 using testing::EndsWith;
 using testing::HasSubstr;
-using testing::IsEmpty;
 
 std::string Counter(const std::string& id, const std::string& triggers, const std::string& more = {}) {
   return R"({"id":")" + id + R"(", "query":")" + id + R"(", "sampleInterval":5, "triggers":[)" + triggers + "]" + more +

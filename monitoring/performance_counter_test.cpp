@@ -59,10 +59,8 @@ TEST(Trigger, EvaluatesTheSampleThatItTakesItself) {
   const CounterScripts scripts = {{L"x", {60, 40, std::nullopt, 50}}};
   PerformanceCounter counter(Settings(L"x"), std::make_unique<ScriptedCounter>(scripts));
   const Trigger trigger = MakeTrigger(L">=", 50);
-  std::vector<bool> results;
-  for (int i = 0; i < 4; ++i)
-    results.push_back(trigger.Evaluate(counter));
-  EXPECT_THAT(results, ElementsAre(true, false, false, true));
+  for (const bool matches : {true, false, false, true})
+    EXPECT_EQ(trigger.Evaluate(counter), matches);
 }
 
 }  // namespace
