@@ -8,6 +8,8 @@
 #include "app/run_parameters.h"
 #include "core/logging.h"
 #include "core/scope_trace.h"
+#include "monitoring/monitoring_manager.h"
+#include "monitoring/stop_listener.h"
 
 namespace {
 
@@ -42,7 +44,9 @@ void WithGui(const ArgumentMap&) {
 }
 
 void Testing() {
-  constexpr wchar_t kScope[] = L"Testing";
-  const logging::ScopeTrace trace(kScope);
-  LOG_ERROR(kScope, L"the monitoring mode is not part of this build");
+  const logging::ScopeTrace trace(L"Testing");
+  st::monitoring::MonitoringManager manager(L"monitoring.json");
+  if (!manager.Init()) return;
+  const st::monitoring::StopListener listener([&manager] { manager.Stop(); });
+  manager.Start();
 }

@@ -23,7 +23,8 @@ class DynamicLibrary {
 
   // `name` is a bare file name (found in the program's and the system's folder only, see RestrictLibrarySearch) or a
   // full path. Check with operator bool; the system's last error says why it failed.
-  explicit DynamicLibrary(const wchar_t* name) : m_module(LoadLibraryQuietly(name, 0)) {}
+  // `flags` are those of LoadLibraryEx.
+  explicit DynamicLibrary(const wchar_t* name, DWORD flags = 0) : m_module(LoadLibraryQuietly(name, flags)) {}
 
   explicit operator bool() const { return static_cast<bool>(m_module); }
   HMODULE Module() const { return m_module.Get(); }

@@ -181,7 +181,7 @@ PartialFile::~PartialFile() {
 }
 
 DWORD PartialFile::Create() {
-  m_file.Reset(CreateFileW((m_path + kPartialSuffix).c_str(), GENERIC_WRITE, 0, nullptr, CREATE_ALWAYS,
+  m_file.Reset(CreateFileW((m_path + kPartialSuffix).c_str(), GENERIC_READ | GENERIC_WRITE, 0, nullptr, CREATE_ALWAYS,
                            FILE_ATTRIBUTE_NORMAL, nullptr));
   if (!m_file) return GetLastError();
   m_isCreated = true;

@@ -54,7 +54,8 @@ class PartialFile {
   PartialFile(const PartialFile&) = delete;
   PartialFile& operator=(const PartialFile&) = delete;
 
-  DWORD Create();  // first
+  DWORD Create();                                 // first
+  HANDLE Handle() const { return m_file.Get(); }  // open for reading and writing, for who writes by a handle
   DWORD Write(std::string_view bytes);
   DWORD Flush();    // what was written so far, so that Publish has less to wait for
   DWORD Publish();  // last; flushes to the disk, closes and renames

@@ -20,7 +20,7 @@ import zipfile
 SOURCE = pathlib.Path(__file__).resolve().parents[2]
 BIN = pathlib.Path(os.environ.get("ST_BIN", SOURCE / "build/windows-cross/bin"))
 PRIVATE_KEY = SOURCE / "stutil/keys/development_private_key.pem"
-LIBRARIES = ("log.dll", "qxlink.dll")
+LIBRARIES = ("log.dll", "qxlink.dll", "framework.dll")
 ON_WINDOWS = sys.platform == "win32"
 TIMEOUT = 90  # seconds for one run; an ordinary one takes one or two
 

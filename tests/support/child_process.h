@@ -27,11 +27,14 @@ class ChildProcess {
       throw std::runtime_error("a child program cannot be started");
     }
     m_process.Reset(process.hProcess);
+    m_id = process.dwProcessId;
     CloseThread(process.hThread);
   }
   ~ChildProcess() { Kill(); }
   ChildProcess(const ChildProcess&) = delete;
   ChildProcess& operator=(const ChildProcess&) = delete;
+
+  DWORD Id() const { return m_id; }
 
   // The next line without its end; what is left when the output ends, and then nothing.
   std::string ReadLine() {
@@ -74,4 +77,5 @@ class ChildProcess {
 
   KernelHandle m_output;
   KernelHandle m_process;
+  DWORD m_id = 0;
 };

@@ -1,0 +1,49 @@
+#include <windows.h>
+
+#include <pdh.h>
+
+#include "core/scoped.h"
+#include "monitoring/counter_query.h"
+
+namespace st::monitoring {
+namespace {
+
+struct PdhQueryTraits {
+  using Type = PDH_HQUERY;
+  static bool IsValid(PDH_HQUERY query) { return query != nullptr && query != INVALID_HANDLE_VALUE; }
+  static void Close(PDH_HQUERY query) { PdhCloseQuery(query); }
+};
+using ScopedPdhQuery = Scoped<PdhQueryTraits>;
+
+class PdhQuery : public CounterQuery {
+ public:
+  int32_t Open() override {
+    PDH_HQUERY query = INVALID_HANDLE_VALUE;
+    const int32_t status = static_cast<int32_t>(PdhOpenQueryW(nullptr, 0, &query));
+    m_query.Reset(status == ERROR_SUCCESS ? query : INVALID_HANDLE_VALUE);
+    return status;
+  }
+  int32_t AddCounter(const std::wstring& path) override {
+    return static_cast<int32_t>(PdhAddCounterW(m_query.Get(), path.c_str(), 0, &m_counter));
+  }
+  int32_t Collect() override { return static_cast<int32_t>(PdhCollectQueryData(m_query.Get())); }
+  int32_t GetValue(double& value) override {
+    PDH_FMT_COUNTERVALUE formatted{};
+    const PDH_STATUS status = PdhGetFormattedCounterValue(m_counter, PDH_FMT_DOUBLE, nullptr, &formatted);
+    if (status == ERROR_SUCCESS) value = formatted.doubleValue;
+    return static_cast<int32_t>(status);
+  }
+
+ private:
+  // What the system refuses as a bad handle until there are real ones.
+  ScopedPdhQuery m_query{INVALID_HANDLE_VALUE};
+  PDH_HCOUNTER m_counter = INVALID_HANDLE_VALUE;  // belongs to the query
+};
+
+}  // namespace
+
+std::unique_ptr<CounterQuery> MakePdhQuery() {
+  return std::make_unique<PdhQuery>();
+}
+
+}  // namespace st::monitoring
