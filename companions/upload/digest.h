@@ -1,4 +1,4 @@
-// SHA-256 of bytes that come piece by piece.
+// Hashes of bytes that come piece by piece.
 #pragma once
 
 #include <windows.h>
@@ -26,13 +26,14 @@ struct HashTraits {
 };
 using Hash = Scoped<HashTraits>;
 
-class Sha256 {
+class Digest {
  public:
-  Sha256();
+  // BCRYPT_SHA256_ALGORITHM, BCRYPT_SHA1_ALGORITHM
+  explicit Digest(const wchar_t* algorithm);
 
   void Add(std::string_view bytes);
 
-  // In lower-case hexadecimal digits, once; empty when the system failed at any step.
+  // The bytes of the hash, once; empty when the system failed at any step.
   std::string Finish();
 
  private:
