@@ -50,6 +50,11 @@ void Digest::Add(std::string_view bytes) {
 }
 
 std::string Digest::Finish() {
+  const std::string bytes = FinishBytes();
+  return HexText({reinterpret_cast<const unsigned char*>(bytes.data()), bytes.size()});
+}
+
+std::string Digest::FinishBytes() {
   std::array<unsigned char, 64> digest{};  // as long as the longest that there is
   DWORD length = 0;
   DWORD written = 0;
@@ -59,5 +64,5 @@ std::string Digest::Finish() {
                       length <= digest.size() &&
                       Succeeded(m_calls.finish(m_hash.Get().handle, digest.data(), length, 0));
   m_isGood = static_cast<bool>(m_algorithm) && Begin();
-  return isGood ? HexText({digest.data(), length}) : std::string();
+  return isGood ? std::string(digest.begin(), digest.begin() + length) : std::string();
 }

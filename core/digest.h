@@ -44,6 +44,8 @@ class Digest {
 
   // In lower-case hexadecimal digits, empty when the system failed at any step. The next Add begins the next digest.
   std::string Finish();
+  // The same as bytes.
+  std::string FinishBytes();
 
  private:
   // The entry points of the library.

@@ -1,17 +1,21 @@
 #!/usr/bin/env python3
 """Runs a real collection under Wine, opens the package again with the development key, checks it and prints a summary.
 
-usage: tools/run_collection.py RELEASE_FOLDER RUN_FOLDER [OPTION of the program …]
+usage: tools/run_collection.py RELEASE_FOLDER RUN_FOLDER [--ingest] [OPTION of the program …]
 
-The program runs as it ships: from a copy of the release folder, with its default settings. Exit status 0 only if the
-package arrived in the outbox, could be opened, and everything in it is sound. Needs the environment of
+The program runs as it ships: from a copy of the release folder, with its default settings. With --ingest it uploads to the
+receiving server of tools/ingest, over HTTPS and a line that is cut in the middle; otherwise it puts the package into its
+outbox. Exit status 0 only if the
+package arrived, could be opened, and everything in it is sound. Needs the environment of
 tools/wine_session.sh.
 """
 
 import collections
 import functools
+import hashlib
 import json
 import os
+import random
 import re
 import shutil
 import subprocess
@@ -23,6 +27,8 @@ from pathlib import Path
 PROJECT = Path(__file__).resolve().parent.parent
 DEVELOPMENT_KEY = PROJECT / "stutil" / "keys" / "development_private_key.pem"
 TIME_LIMIT = 600  # seconds for one start of the program
+INSTALLER_LOG = 2 << 20  # bytes of a log as installers leave them, so that the package has a middle
+CUT_AFTER = 1 << 20  # bytes
 
 
 class RunFailed(Exception):
@@ -45,11 +51,16 @@ def start(folder, *arguments):
 
 
 @functools.cache
+def variable(name):
+    """A folder that an environment variable of the program names."""
+    answer = subprocess.run(["wine", "cmd", "/c", f"echo %{name}%"], capture_output=True, text=True, check=True,
+                            timeout=TIME_LIMIT, stdin=subprocess.DEVNULL)
+    return windows_to_unix(answer.stdout.strip())
+
+
 def default_folder(name):
     """A folder of the shipped configuration: all lie below the user's local application data."""
-    answer = subprocess.run(["wine", "cmd", "/c", "echo %LOCALAPPDATA%"], capture_output=True, text=True, check=True,
-                            timeout=TIME_LIMIT, stdin=subprocess.DEVNULL)
-    return windows_to_unix(answer.stdout.strip() + "\\Quorvex\\SupportTool\\" + name)
+    return variable("LOCALAPPDATA") / "Quorvex" / "SupportTool" / name
 
 
 class Log:
@@ -77,6 +88,78 @@ def new_package(outbox, before):
     if len(found) != 1:
         raise RunFailed(f"expected one new package in {outbox}, found {len(found)}")
     return found[0]
+
+
+class Outbox:
+    """Where the package goes without an upload service."""
+
+    def __init__(self):
+        self.folder = default_folder("Outbox")
+        self.before = set(self.folder.glob("*.zip")) if self.folder.exists() else set()
+
+    def __enter__(self):
+        return self
+
+    def __exit__(self, *_):
+        pass
+
+    def package(self, _log):
+        return new_package(self.folder, self.before)
+
+    result = "delivered to the outbox"
+
+
+class Ingest:
+    """The receiving server behind a line that breaks once, in the middle of the package."""
+
+    result = "delivered over HTTPS through a line that broke, and received with the right hash"
+
+    def __init__(self, run_folder):
+        sys.path.insert(0, str(PROJECT / "tests" / "support"))
+        import certificates
+        import fault_proxy
+        import ingest
+
+        folder = run_folder.with_name(run_folder.name + "-ingest")
+        shutil.rmtree(folder, ignore_errors=True)
+        made = certificates.make_certificates(folder / "certificates")
+        self.server = ingest.IngestServer(folder, "--cert", str(made / "localhost.pem"), "--key", str(made / "localhost.key"))
+        self.make_line = fault_proxy.FaultProxy
+        self.faults = fault_proxy.Faults
+        self.configuration = run_folder / "qxlink.json"
+        self.log = variable("TMP") / "qxinst.run.log"
+        self.authority = unix_to_windows(made / "ca.pem")
+
+    def __enter__(self):
+        self.server.__enter__()
+        self.line = self.make_line(self.server.port).__enter__()
+        self.line.upstream = self.faults(cut_after=CUT_AFTER)
+        self.log.write_bytes(random.Random(1).randbytes(INSTALLER_LOG))
+        self.configuration.write_text(json.dumps({"endpoint": f"https://localhost:{self.line.port}/files",
+                                                  "ca_file": self.authority, "retry_delay": 0.2}), encoding="utf-8")
+        return self
+
+    def __exit__(self, *problem):
+        self.log.unlink(missing_ok=True)
+        self.line.__exit__(*problem)
+        self.server.__exit__(*problem)
+
+    def package(self, log):
+        receipts = self.server.receipts()
+        if len(receipts) != 1:
+            raise RunFailed(f"expected one receipt, found {len(receipts)}")
+        name, receipt = next(iter(receipts.items()))
+        path = self.server.folder / "uploads" / name
+        if hashlib.sha256(path.read_bytes()).hexdigest() != receipt["sha256"]:
+            raise RunFailed("the receipt's SHA-256 is not that of the package")
+        report = re.search(r"\d+ bytes are with the service after .*", log.text())
+        if not report or " 1 attempts" in report.group():
+            raise RunFailed("the upload was not resumed; see the log")
+        print(f"   receipt   {self.server.folder}/receipts/{name}.json\n   sha256    {receipt['sha256']}\n   {report.group()}")
+        # Under a name that the program can open; the server has its own copy.
+        copy = self.configuration.with_name("received.zip")
+        shutil.copyfile(path, copy)
+        return copy
 
 
 def check_archive(path):
@@ -117,16 +200,16 @@ def main(release, run_folder, *options):
     run_folder = Path(run_folder).resolve()
     shutil.rmtree(run_folder, ignore_errors=True)
     shutil.copytree(release, run_folder)
-    outbox = default_folder("Outbox")
-    before = set(outbox.glob("*.zip")) if outbox.exists() else set()
-
-    log = Log()
-    begin = time.monotonic()
-    start(run_folder, "nogui", "collect", *options)
-    seconds = time.monotonic() - begin
-    if log.return_code() != 0:
-        raise RunFailed(f"the collection ended with code {log.return_code()}; see {log.path}")
-    package = new_package(outbox, before)
+    options = list(options)
+    with Ingest(run_folder) if "--ingest" in options else Outbox() as receiver:
+        options = [option for option in options if option != "--ingest"]
+        log = Log()
+        begin = time.monotonic()
+        start(run_folder, "nogui", "collect", *options)
+        seconds = time.monotonic() - begin
+        if log.return_code() != 0:
+            raise RunFailed(f"the collection ended with code {log.return_code()}; see {log.path}")
+        package = receiver.package(log)
     for left in ("collected", "collected.zip"):
         if (run_folder / left).exists():
             raise RunFailed(f"{left} was left behind in {run_folder}")
@@ -138,7 +221,7 @@ def main(release, run_folder, *options):
     if log.return_code() != 1 or not plain.exists():
         raise RunFailed(f"the package could not be decrypted; see {log.path}")
     summary(check_archive(plain), package, plain, log, seconds)
-    print("== the package is whole: collected, packed, encrypted, delivered to the outbox, and opened again")
+    print(f"== the package is whole: collected, packed, encrypted, {receiver.result}, and opened again")
 
 
 if __name__ == "__main__":

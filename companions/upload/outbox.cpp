@@ -1,9 +1,8 @@
 #include "companions/upload/outbox.h"
 
-#include <algorithm>
-#include <vector>
+#include <set>
 
-#include "core/hex.h"
+#include "companions/upload/transfer_progress.h"
 #include "core/digest.h"
 #include "core/files.h"
 #include "core/format.h"
@@ -18,31 +17,14 @@ namespace {
 constexpr wchar_t kScope[] = L"qxlink::PutIntoOutbox";
 constexpr size_t kBufferSize = size_t{1} << 20;
 constexpr size_t kLongestOriginalName = 200;
-constexpr ULONGLONG kProgressInterval = 100;  // milliseconds
+constexpr uint64_t kLongestDescription = 1 << 20;
+constexpr uint64_t kAbandonedAfter = uint64_t{3600} * 10'000'000;  // in units of FILETIME
+constexpr std::wstring_view kDescriptionSuffix = L".json";
 
 bool RandomNumber(uint64_t& number) {
   return BCryptGenRandom(nullptr, reinterpret_cast<PUCHAR>(&number), sizeof number, BCRYPT_USE_SYSTEM_PREFERRED_RNG) >=
          0;
 }
-
-// Calls the caller's progress function, but not too often. False when the caller wants no more.
-class ProgressReport {
- public:
-  ProgressReport(const UploadRequest& request, uint64_t total) : m_request(request), m_total(total) {}
-
-  bool Sent(uint64_t sent, bool isEnd) {
-    if (m_request.progress == nullptr) return true;
-    const ULONGLONG now = GetTickCount64();
-    if (!isEnd && now - m_last < kProgressInterval) return true;
-    m_last = now;
-    return m_request.progress(m_request.user, sent, std::max(sent, m_total)) == 0;
-  }
-
- private:
-  const UploadRequest& m_request;
-  const uint64_t m_total;
-  ULONGLONG m_last = 0;
-};
 
 struct CopyTotals {
   uint64_t size = 0;
@@ -51,11 +33,11 @@ struct CopyTotals {
 
 int32_t CopyIntoFile(const UploadRequest& request, UploadSource& source, PartialFile& file, CopyTotals& totals) {
   std::vector<char> buffer(kBufferSize);
-  ProgressReport progress(request, source.Size());
+  TransferProgress progress(request, source.Size());
   Digest hash(BCRYPT_SHA256_ALGORITHM);
   for (;;) {
     size_t count = 0;
-    if (const DWORD error = source.Read(buffer, count); error != ERROR_SUCCESS) {
+    if (const DWORD error = source.ReadAt(totals.size, buffer, count); error != ERROR_SUCCESS) {
       LOG_ERROR(kScope, L"the file to upload cannot be read, error %u", error);
       return QXSKYLANE_FILE_UNREADABLE;
     }
@@ -66,8 +48,12 @@ int32_t CopyIntoFile(const UploadRequest& request, UploadSource& source, Partial
     }
     hash.Add(bytes);
     totals.size += count;
-    if (!progress.Sent(totals.size, count == 0)) return QXSKYLANE_CANCELLED;
+    if (!progress.At(totals.size)) return QXSKYLANE_CANCELLED;
     if (count == 0) break;
+  }
+  if (totals.size < source.Size()) {
+    LOG_ERROR(kScope, L"the file to upload became shorter while it was read");
+    return QXSKYLANE_FILE_UNREADABLE;
   }
   totals.sha256 = hash.Finish();
   return QXSKYLANE_OK;
@@ -80,8 +66,37 @@ void WriteDescription(const std::wstring& path, const UploadRequest& request, co
   description["size"] = static_cast<Json::UInt64>(totals.size);
   if (!totals.sha256.empty()) description["sha256"] = totals.sha256;
   if (!request.tags.isNull()) description["tags"] = request.tags;
-  const DWORD error = WriteWholeFile(path + L".json", WriteStyledJson(description));
+  const DWORD error = WriteWholeFile(path + std::wstring(kDescriptionSuffix), WriteStyledJson(description));
   if (error != ERROR_SUCCESS) LOG_WARNING(kScope, L"the description of the file cannot be written, error %u", error);
+}
+
+// "<yyyymmdd-hhmmss>-<16 hexadecimal digits>-"
+constexpr size_t kPrefixLength = 33;
+
+bool IsOutboxName(std::wstring_view name) {
+  if (name.size() <= kPrefixLength) return false;
+  for (size_t i = 0; i < kPrefixLength; ++i) {
+    const wchar_t c = name[i];
+    const bool isDash = i == 8 || i == 15 || i == 32;
+    const bool isDigit = (c >= L'0' && c <= L'9') || (i > 15 && c >= L'a' && c <= L'f');
+    if (isDash ? c != L'-' : !isDigit) return false;
+  }
+  return true;
+}
+
+uint64_t Number(const FILETIME& time) {
+  return uint64_t{time.dwHighDateTime} << 32 | time.dwLowDateTime;
+}
+
+// Calls `take` with the record of each file of the folder whose name an upload made.
+template <class Function>
+void ForEachOutboxFile(const std::wstring& folder, Function take) {
+  WIN32_FIND_DATAW data{};
+  const FindHandle find(FindFirstFileW((folder + L"\\*").c_str(), &data));
+  if (!find) return;
+  do {
+    if ((data.dwFileAttributes & FILE_ATTRIBUTE_DIRECTORY) == 0 && IsOutboxName(data.cFileName)) take(data);
+  } while (FindNextFileW(find.Get(), &data));
 }
 
 }  // namespace
@@ -126,7 +141,8 @@ std::wstring OutboxFileName(const SYSTEMTIME& utc, uint64_t random, std::wstring
                 utc.wSecond, random, original.empty() ? L"upload" : original.c_str());
 }
 
-int32_t PutIntoOutbox(const std::wstring& folder, const UploadRequest& request, UploadSource& source) {
+int32_t PutIntoOutbox(const std::wstring& folder, const UploadRequest& request, UploadSource& source,
+                      std::wstring& path) {
   uint64_t random = 0;
   if (!RandomNumber(random)) {
     LOG_ERROR(kScope, L"the system has no random numbers");
@@ -134,7 +150,7 @@ int32_t PutIntoOutbox(const std::wstring& folder, const UploadRequest& request, 
   }
   SYSTEMTIME now{};
   GetSystemTime(&now);
-  const std::wstring path = folder + L'\\' + OutboxFileName(now, random, ToWide(request.filePath));
+  path = folder + L'\\' + OutboxFileName(now, random, ToWide(request.filePath));
   PartialFile file(path);
   CopyTotals totals;
   if (const DWORD error = file.Create(); error != ERROR_SUCCESS) {
@@ -149,6 +165,54 @@ int32_t PutIntoOutbox(const std::wstring& folder, const UploadRequest& request, 
   WriteDescription(path, request, totals);
   LOG_INFO(kScope, L"%llu bytes lie in the outbox as %s", totals.size, std::wstring(LastPathComponent(path)).c_str());
   return QXSKYLANE_OK;
+}
+
+std::vector<std::wstring> FilesInOutbox(const std::wstring& folder) {
+  std::set<std::wstring> names;
+  ForEachOutboxFile(folder, [&](const WIN32_FIND_DATAW& data) { names.insert(data.cFileName); });
+  std::vector<std::wstring> paths;
+  for (const std::wstring& name : names) {
+    if (name.ends_with(kPartialSuffix)) continue;
+    const bool isDescription =
+        name.ends_with(kDescriptionSuffix) && names.count(name.substr(0, name.size() - kDescriptionSuffix.size())) != 0;
+    if (!isDescription) paths.push_back(folder + L'\\' + name);
+  }
+  return paths;  // their names begin with the time
+}
+
+UploadRequest RequestOfOutboxFile(const std::wstring& path) {
+  UploadRequest request;
+  request.filePath = ToUtf8(LastPathComponent(path).substr(kPrefixLength));
+  std::string json;
+  std::string problem;
+  Json::Value description;
+  if (ReadWholeFile(path + std::wstring(kDescriptionSuffix), kLongestDescription, json) != ERROR_SUCCESS ||
+      !ParseJson(json, description, problem) || !description.isObject()) {
+    LOG_WARNING(kScope, L"%s has no readable description", std::wstring(LastPathComponent(path)).c_str());
+    return request;
+  }
+  if (description["category"].isString()) request.category = description["category"].asString();
+  if (description["tags"].isObject()) request.tags = description["tags"];
+  return request;
+}
+
+void RemoveFromOutbox(const std::wstring& path, FileSource& source) {
+  if (const DWORD error = source.Delete(); error != ERROR_SUCCESS) {
+    LOG_WARNING(kScope, L"%s was sent but cannot be deleted from the outbox, error %u",
+                std::wstring(LastPathComponent(path)).c_str(), error);
+    return;
+  }
+  DeleteFileW((path + std::wstring(kDescriptionSuffix)).c_str());
+}
+
+void DeleteAbandonedParts(const std::wstring& folder) {
+  FILETIME now{};
+  GetSystemTimeAsFileTime(&now);
+  ForEachOutboxFile(folder, [&](const WIN32_FIND_DATAW& data) {
+    const std::wstring name = data.cFileName;
+    if (!name.ends_with(kPartialSuffix) || Number(data.ftLastWriteTime) + kAbandonedAfter > Number(now)) return;
+    if (DeleteFileW((folder + L'\\' + name).c_str())) LOG_INFO(kScope, L"deleted %s, left half written", name.c_str());
+  });
 }
 
 }  // namespace qxlink

@@ -6,23 +6,14 @@
 #include <windows.h>
 
 #include <cstdint>
-#include <functional>
-#include <span>
 #include <string>
 #include <string_view>
+#include <vector>
 
 #include "companions/upload/upload_request.h"
+#include "companions/upload/upload_source.h"
 
 namespace qxlink {
-
-// Where the bytes of an upload come from, in order.
-class UploadSource {
- public:
-  virtual ~UploadSource() = default;
-  virtual uint64_t Size() const = 0;
-  // Fills the buffer as far as there are bytes; `count` 0 is the end. A Windows error number.
-  virtual DWORD Read(std::span<char> buffer, size_t& count) = 0;
-};
 
 // The configured folder for this process and this library: environment variables expanded, relative paths below
 // `libraryFolder`. Empty when a variable does not exist.
@@ -35,7 +26,22 @@ DWORD CreateOutboxFolder(const std::wstring& folder);
 // ones, with "_" for what cannot stand in a file name.
 std::wstring OutboxFileName(const SYSTEMTIME& utc, uint64_t random, std::wstring_view originalPath);
 
-// Copies the source into the folder, which is there. A QxskylaneResult; failures are logged here.
-int32_t PutIntoOutbox(const std::wstring& folder, const UploadRequest& request, UploadSource& source);
+// Copies the source into the folder, which is there; `path` becomes the file's. A QxskylaneResult; failures are logged
+// here.
+int32_t PutIntoOutbox(const std::wstring& folder, const UploadRequest& request, UploadSource& source,
+                      std::wstring& path);
+
+// The paths of the files that lie in the folder, the oldest first; none when it does not exist. Only names as
+// OutboxFileName makes them count.
+std::vector<std::wstring> FilesInOutbox(const std::wstring& folder);
+
+// The request with which a file came into the outbox, as far as its description says.
+UploadRequest RequestOfOutboxFile(const std::wstring& path);
+
+// Deletes the file, which `source` has open for itself alone, and its description.
+void RemoveFromOutbox(const std::wstring& path, FileSource& source);
+
+// Deletes what uploads left half written more than an hour ago, because their process was ended.
+void DeleteAbandonedParts(const std::wstring& folder);
 
 }  // namespace qxlink

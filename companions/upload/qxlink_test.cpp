@@ -5,6 +5,7 @@
 #include <json/value.h>
 
 #include <algorithm>
+#include <atomic>
 #include <memory>
 #include <set>
 #include <thread>
@@ -203,10 +204,28 @@ TEST_F(QxlinkTest, AnOutboxThatCannotBeIsAnErrorOfItsOwn) {
   EXPECT_EQ(Content(L"file"), "in the way");
 }
 
-TEST_F(QxlinkTest, NeverCallsAnUploadToAServiceDone) {
-  ASSERT_EQ(Start(R"({"endpoint": "https://uploads.example/files", "outbox": "out"})"), QXSKYLANE_OK);
-  EXPECT_EQ(Upload(m_folder.MakeFile(L"a.zip", "a")), QXSKYLANE_NOT_SUPPORTED);
+TEST_F(QxlinkTest, NeverCallsAnUploadDoneThatNobodyReceived) {
+  ASSERT_EQ(Start(R"({"endpoint": "https://nobody.invalid/files", "outbox": "out", "retries": 0, "proxy": "none"})"),
+            QXSKYLANE_OK);
+  EXPECT_EQ(Upload(m_folder.MakeFile(L"a.zip", "a")), QXSKYLANE_NO_CONNECTION);
   EXPECT_FALSE(PathExists(m_folder.Path(L"out")));
+}
+
+TEST_F(QxlinkTest, DeletesOnlyPartsThatNobodyWritesAnyMore) {
+  ASSERT_EQ(Start(R"({"outbox": "out"})"), QXSKYLANE_OK);
+  const wchar_t* const kNames[] = {L"out\\20200101-000000-0123456789abcdef-old.zip.partial",
+                                   L"out\\20200101-000000-0123456789abcdef-new.zip.partial", L"out\\notes.partial"};
+  for (const wchar_t* name : kNames) {
+    const std::wstring path = m_folder.MakeFile(name, "part");
+    if (name == kNames[1]) continue;
+    const KernelHandle file(CreateFileW(path.c_str(), FILE_WRITE_ATTRIBUTES, 0, nullptr, OPEN_EXISTING, 0, nullptr));
+    const FILETIME longAgo{0, 0x01D00000};
+    SetFileTime(file.Get(), nullptr, nullptr, &longAgo);
+  }
+  ASSERT_EQ(Upload(m_folder.MakeFile(L"a.zip", "a")), QXSKYLANE_OK);
+  EXPECT_FALSE(PathExists(m_folder.Path(kNames[0])));
+  EXPECT_TRUE(PathExists(m_folder.Path(kNames[1])));
+  EXPECT_TRUE(PathExists(m_folder.Path(kNames[2])));
 }
 
 TEST_F(QxlinkTest, DoesNotStartWithAConfigurationThatCannotBe) {
@@ -259,19 +278,54 @@ TEST_F(QxlinkTest, RefusesRequestsThatCannotBe) {
   EXPECT_EQ(upload(m_context, &longer), QXSKYLANE_OK);
 }
 
-TEST_F(QxlinkTest, SaysWhatThisVersionCannotDo) {
+TEST_F(QxlinkTest, AnswersFromItsThreadInTheOrderOfTheCalls) {
+  ASSERT_EQ(Start(R"({"outbox": "out"})"), QXSKYLANE_OK);
+  struct Answers {
+    std::vector<std::pair<int32_t, std::string>> seen;
+    DWORD caller = GetCurrentThreadId();
+  } answers;
+  const QxskylaneDone done = [](void* user, int32_t result, const QxskylaneResponse* response) {
+    auto& seen = *static_cast<Answers*>(user);
+    EXPECT_NE(GetCurrentThreadId(), seen.caller);
+    seen.seen.emplace_back(result, response == nullptr ? "" : response->location);
+  };
+  const auto uploadFile = Call<decltype(&qxskylane_file_upload_async)>("qxskylane_file_upload_async");
+  const auto uploadMemory = Call<decltype(&qxskylane_mem_upload_async)>("qxskylane_mem_upload_async");
+  std::string path = ToUtf8(m_folder.MakeFile(L"a.zip", "a"));
+  QxskylaneUpload request = Request(path);
+  ASSERT_EQ(uploadFile(m_context, &request, done, &answers), QXSKYLANE_OK);
+  path.assign("overwritten by its owner");  // the library has its copy
+  const std::string missing = ToUtf8(m_folder.Path(L"missing.zip"));
+  request = Request(missing);
+  ASSERT_EQ(uploadFile(m_context, &request, done, &answers), QXSKYLANE_OK);
+  EXPECT_EQ(uploadFile(m_context, &request, nullptr, nullptr), QXSKYLANE_BAD_ARGUMENT);
+  std::atomic<bool> isSent = false;
+  const QxskylaneDone last = [](void* user, int32_t, const QxskylaneResponse*) {
+    *static_cast<std::atomic<bool>*>(user) = true;
+  };
+  ASSERT_EQ(uploadMemory(m_context, &request, "hello", 5, last, &isSent), QXSKYLANE_OK);
+  for (int i = 0; i < 500 && !isSent; ++i)
+    Sleep(10);
+  ASSERT_EQ(answers.seen.size(), 2u);
+  EXPECT_EQ(answers.seen[0].first, QXSKYLANE_OK);
+  EXPECT_TRUE(answers.seen[0].second.ends_with("-a.zip")) << answers.seen[0].second;
+  EXPECT_EQ(answers.seen[1], std::make_pair(int32_t{QXSKYLANE_FILE_UNREADABLE}, std::string()));
+  EXPECT_EQ(FilesIn(m_folder.Path(L"out")).size(), 4u);
+}
+
+TEST_F(QxlinkTest, MessagesNeedAServiceForThem) {
   ASSERT_EQ(Start("{}"), QXSKYLANE_OK);
   const auto ask = Call<decltype(&qxskylane_ask_json)>("qxskylane_ask_json");
+  const auto free = Call<decltype(&qxskylane_free_response)>("qxskylane_free_response");
   QxskylaneResponse garbage{};
   QxskylaneResponse* response = &garbage;
   EXPECT_EQ(ask(m_context, "topic", "{}", &response), QXSKYLANE_NOT_SUPPORTED);
   EXPECT_EQ(response, nullptr);
+  free(response);
   EXPECT_EQ(ask(m_context, "topic", "{}", nullptr), QXSKYLANE_BAD_ARGUMENT);
-  const auto async = Call<decltype(&qxskylane_file_upload_async)>("qxskylane_file_upload_async");
-  const QxskylaneUpload request = Request("a");
-  const QxskylaneDone never = [](void*, int32_t, const QxskylaneResponse*) { ADD_FAILURE() << "called"; };
-  EXPECT_EQ(async(m_context, &request, never, nullptr), QXSKYLANE_NOT_SUPPORTED);
-  EXPECT_EQ(async(m_context, &request, nullptr, nullptr), QXSKYLANE_BAD_ARGUMENT);
+  EXPECT_EQ(ask(m_context, "a\r\nHost: b", "{}", &response), QXSKYLANE_BAD_ARGUMENT);
+  EXPECT_EQ(ask(m_context, "topic", "{no json", &response), QXSKYLANE_BAD_ARGUMENT);
+  EXPECT_EQ(ask(m_context, nullptr, "{}", &response), QXSKYLANE_BAD_ARGUMENT);
 }
 
 TEST_F(QxlinkTest, EveryResultHasATextOfItsOwn) {

@@ -1,10 +1,10 @@
 #include "companions/upload/upload_context.h"
 
-#include <algorithm>
-#include <cstring>
+#include <new>
+#include <utility>
 
+#include "companions/upload/upload_response.h"
 #include "core/files.h"
-#include "core/paths.h"
 #include "core/text.h"
 
 namespace qxlink {
@@ -14,56 +14,16 @@ constexpr wchar_t kConfigureScope[] = L"qxlink::Configure";
 constexpr wchar_t kUploadScope[] = L"qxlink::Upload";
 constexpr uint64_t kLongestConfiguration = 64 << 10;
 
-class FileSource : public UploadSource {
- public:
-  DWORD Open(const std::wstring& path) {
-    m_file.Reset(CreateFileW(ExtendedPath(path).c_str(), GENERIC_READ, FILE_SHARE_READ, nullptr, OPEN_EXISTING,
-                             FILE_FLAG_SEQUENTIAL_SCAN, nullptr));
-    LARGE_INTEGER size{};
-    if (!m_file || !GetFileSizeEx(m_file.Get(), &size)) return GetLastError();
-    m_size = static_cast<uint64_t>(size.QuadPart);
-    return ERROR_SUCCESS;
-  }
-
-  uint64_t Size() const override { return m_size; }
-
-  DWORD Read(std::span<char> buffer, size_t& count) override {
-    DWORD read = 0;
-    if (!ReadFile(m_file.Get(), buffer.data(), static_cast<DWORD>(buffer.size()), &read, nullptr))
-      return GetLastError();
-    count = read;
-    return ERROR_SUCCESS;
-  }
-
- private:
-  KernelHandle m_file;
-  uint64_t m_size = 0;
-};
-
-class MemorySource : public UploadSource {
- public:
-  explicit MemorySource(std::string_view bytes) : m_size(bytes.size()), m_rest(bytes) {}
-
-  uint64_t Size() const override { return m_size; }
-
-  DWORD Read(std::span<char> buffer, size_t& count) override {
-    count = m_rest.copy(buffer.data(), buffer.size());
-    m_rest.remove_prefix(count);
-    return ERROR_SUCCESS;
-  }
-
- private:
-  const uint64_t m_size;
-  std::string_view m_rest;
-};
-
 }  // namespace
 }  // namespace qxlink
 
 using namespace qxlink;
 
+QxskylaneContext::~QxskylaneContext() {
+  m_cancel.Set();
+}
+
 int32_t QxskylaneContext::Configure(const std::wstring& libraryFolder) {
-  m_libraryFolder = libraryFolder;
   std::string json;
   const DWORD error = ReadWholeFile(libraryFolder + L"\\qxlink.json", kLongestConfiguration, json);
   if (error == ERROR_FILE_NOT_FOUND) {
@@ -82,7 +42,8 @@ int32_t QxskylaneContext::Configure(const std::wstring& libraryFolder) {
   }
   if (!parsed.problems.empty()) return QXSKYLANE_CONFIGURATION_INVALID;
   m_config = parsed.config;
-  m_outbox = m_config.outbox;
+  m_options.outbox = m_config.outbox;
+  m_delivery = std::make_unique<Delivery>(m_config, libraryFolder, m_cancel);
   return QXSKYLANE_OK;
 }
 
@@ -94,7 +55,7 @@ int32_t QxskylaneContext::SetOption(int32_t option, int64_t value) {
     return QXSKYLANE_OPTION_REFUSED;
   }
   const std::lock_guard lock(m_optionMutex);
-  m_usePlainHttp = value == 1;
+  m_options.usePlainHttp = value == 1;
   return QXSKYLANE_OK;
 }
 
@@ -102,51 +63,58 @@ int32_t QxskylaneContext::SetOption(int32_t option, std::string_view text) {
   if (option != QXSKYLANE_OPTION_OUTBOX) return QXSKYLANE_OPTION_UNKNOWN;
   if (text.empty() || text.find('\0') != std::string_view::npos) return QXSKYLANE_BAD_ARGUMENT;
   const std::lock_guard lock(m_optionMutex);
-  m_outbox = text;
+  m_options.outbox = text;
   return QXSKYLANE_OK;
 }
 
 int32_t QxskylaneContext::GetOption(int32_t option, int64_t& value) {
   if (option != QXSKYLANE_OPTION_PLAIN_HTTP) return QXSKYLANE_OPTION_UNKNOWN;
   const std::lock_guard lock(m_optionMutex);
-  value = m_usePlainHttp ? 1 : 0;
+  value = m_options.usePlainHttp ? 1 : 0;
   return QXSKYLANE_OK;
 }
 
-int32_t QxskylaneContext::UploadFile(const UploadRequest& request) {
+DeliveryOptions QxskylaneContext::Options() {
+  const std::lock_guard lock(m_optionMutex);
+  return m_options;
+}
+
+int32_t QxskylaneContext::UploadFile(const UploadRequest& request, UploadAnswer& answer) {
   FileSource source;
   if (const DWORD error = source.Open(ToWide(request.filePath)); error != ERROR_SUCCESS) {
     LOG_ERROR(kUploadScope, L"the file to upload cannot be opened, error %u", error);
     return QXSKYLANE_FILE_UNREADABLE;
   }
-  return Upload(request, source);
+  return Upload(request, source, answer);
 }
 
-int32_t QxskylaneContext::UploadMemory(const UploadRequest& request, std::string_view bytes) {
+int32_t QxskylaneContext::UploadMemory(const UploadRequest& request, std::string_view bytes, UploadAnswer& answer) {
   MemorySource source(bytes);
-  return Upload(request, source);
+  return Upload(request, source, answer);
 }
 
-int32_t QxskylaneContext::Upload(const UploadRequest& request, UploadSource& source) {
-  if (!m_config.endpoint.empty()) {
-    LOG_ERROR(kUploadScope,
-              L"uploading to a service is not supported yet, the file was NOT uploaded; "
-              L"remove \"endpoint\" from qxlink.json to use the outbox");
-    return QXSKYLANE_NOT_SUPPORTED;
-  }
-  std::string outbox;
-  {
-    const std::lock_guard lock(m_optionMutex);
-    outbox = m_outbox;
-  }
-  const std::wstring folder = ResolveOutboxFolder(ToWide(outbox), m_libraryFolder);
-  if (folder.empty()) {
-    LOG_ERROR(kUploadScope, L"the outbox folder names an environment variable that does not exist");
-    return QXSKYLANE_CONFIGURATION_INVALID;
-  }
-  if (const DWORD error = CreateOutboxFolder(folder); error != ERROR_SUCCESS) {
-    LOG_ERROR(kUploadScope, L"the outbox folder cannot be made, error %u", error);
-    return QXSKYLANE_OUTBOX_UNWRITABLE;
-  }
-  return PutIntoOutbox(folder, request, source);
+int32_t QxskylaneContext::Upload(const UploadRequest& request, UploadSource& source, UploadAnswer& answer) {
+  return m_delivery->Upload(request, source, Options(), answer);
+}
+
+int32_t QxskylaneContext::Tell(std::string_view topic, const char* contentType, std::string_view bytes,
+                               UploadAnswer& answer) {
+  return m_delivery->Tell(topic, contentType, bytes, Options().usePlainHttp, answer);
+}
+
+void QxskylaneContext::Begin(std::function<int32_t(UploadAnswer&)> job, QxskylaneDone done, void* user) {
+  m_worker.Give([job = std::move(job), done, user, this]() noexcept {
+    UploadAnswer answer;
+    int32_t result = QXSKYLANE_CANCELLED;
+    try {
+      if (!m_cancel.IsSet()) result = job(answer);
+    } catch (const std::bad_alloc&) {
+      result = QXSKYLANE_OUT_OF_MEMORY;
+    } catch (...) {
+      result = QXSKYLANE_INTERNAL_ERROR;
+    }
+    const bool isAnswered = answer.status != 0 || !answer.location.empty();
+    const UploadResponse response(std::move(answer));
+    done(user, result, isAnswered ? &response : nullptr);
+  });
 }

@@ -1,15 +1,21 @@
 // The exported functions: each checks its arguments, does its job on the context and lets nothing escape.
+#include <cstring>
 #include <memory>
 #include <new>
+#include <utility>
 
+#include "companions/upload/http_text.h"
 #include "companions/upload/upload_context.h"
 #include "companions/upload/upload_request.h"
+#include "companions/upload/upload_response.h"
 #include "companions/upload/upload_results.h"
+#include "core/json.h"
 #include "core/logging.h"
 #include "core/program_path.h"
 
 namespace {
 
+using qxlink::UploadAnswer;
 using qxlink::UploadRequest;
 
 // Runs `job`, which returns a QxskylaneResult.
@@ -36,23 +42,74 @@ int32_t WithRequest(const QxskylaneContext* context, const QxskylaneUpload* uplo
   });
 }
 
-// Messages and the asynchronous forms need a service; this version knows only the outbox.
-int32_t NotSupported(const QxskylaneContext* context, const wchar_t* function) noexcept {
+constexpr char kText[] = "text/plain; charset=utf-8";
+constexpr char kJson[] = "application/json";
+constexpr char kBytes[] = "application/octet-stream";
+constexpr uint64_t kLargestMessage = 64 << 20;
+
+bool IsJson(std::string_view text) {
+  Json::Value document;
+  std::string problem;
+  return ParseJson(text, document, problem);
+}
+
+// A message as the service gets it. False when it cannot be one.
+struct Message {
+  std::string topic;
+  const char* contentType = kText;
+  std::string_view bytes;
+
+  bool Read(const char* newTopic, const char* type, const void* data, uint64_t size) {
+    if (newTopic == nullptr || (data == nullptr && size != 0) || size > kLargestMessage) return false;
+    topic = newTopic;
+    contentType = type;
+    bytes = {static_cast<const char*>(data), static_cast<size_t>(size)};
+    return !topic.empty() && qxlink::IsHeaderValue(topic) && (type != kJson || IsJson(bytes));
+  }
+  bool Read(const char* newTopic, const char* type, const char* text) {
+    return text != nullptr && Read(newTopic, type, text, std::strlen(text));
+  }
+};
+
+template <class... Parts>
+int32_t Push(QxskylaneContext* context, Parts... parts) noexcept {
   return Guarded([&]() -> int32_t {
-    if (context == nullptr) return QXSKYLANE_BAD_ARGUMENT;
-    LOG_WARNING(function, L"not supported by this version");
-    return QXSKYLANE_NOT_SUPPORTED;
+    Message message;
+    if (context == nullptr || !message.Read(parts...)) return QXSKYLANE_BAD_ARGUMENT;
+    UploadAnswer answer;
+    return context->Tell(message.topic, message.contentType, message.bytes, answer);
   });
 }
 
-int32_t NotSupported(const QxskylaneContext* context, const wchar_t* function, QxskylaneResponse** response) noexcept {
+template <class... Parts>
+int32_t Ask(QxskylaneContext* context, QxskylaneResponse** response, Parts... parts) noexcept {
   if (response == nullptr) return QXSKYLANE_BAD_ARGUMENT;
   *response = nullptr;
-  return NotSupported(context, function);
+  return Guarded([&]() -> int32_t {
+    Message message;
+    if (context == nullptr || !message.Read(parts...)) return QXSKYLANE_BAD_ARGUMENT;
+    UploadAnswer answer;
+    const int32_t result = context->Tell(message.topic, message.contentType, message.bytes, answer);
+    // qxskylane_free_response takes it back.
+    if (result == QXSKYLANE_OK) *response = std::make_unique<qxlink::UploadResponse>(std::move(answer)).release();
+    return result;
+  });
 }
 
-int32_t NotSupported(const QxskylaneContext* context, const wchar_t* function, QxskylaneDone done) noexcept {
-  return done == nullptr ? static_cast<int32_t>(QXSKYLANE_BAD_ARGUMENT) : NotSupported(context, function);
+// `copies`: the bytes of the message are the caller's only until the return.
+template <class... Parts>
+int32_t AskLater(QxskylaneContext* context, QxskylaneDone done, void* user, bool copies, Parts... parts) noexcept {
+  return Guarded([&]() -> int32_t {
+    Message message;
+    if (context == nullptr || done == nullptr || !message.Read(parts...)) return QXSKYLANE_BAD_ARGUMENT;
+    std::string copy(copies ? message.bytes : std::string_view());
+    context->Begin(
+        [context, message, copies, copy = std::move(copy)](UploadAnswer& answer) {
+          return context->Tell(message.topic, message.contentType, copies ? copy : message.bytes, answer);
+        },
+        done, user);
+    return QXSKYLANE_OK;
+  });
 }
 
 }  // namespace
@@ -74,45 +131,50 @@ int32_t qxskylane_uninit(QxskylaneContext* context) {
   return QXSKYLANE_OK;
 }
 
-int32_t qxskylane_push_info(QxskylaneContext* context, const char*, const char*) {
-  return NotSupported(context, L"qxskylane_push_info");
+int32_t qxskylane_push_info(QxskylaneContext* context, const char* topic, const char* text) {
+  return Push(context, topic, kText, text);
 }
 
-int32_t qxskylane_push_json(QxskylaneContext* context, const char*, const char*) {
-  return NotSupported(context, L"qxskylane_push_json");
+int32_t qxskylane_push_json(QxskylaneContext* context, const char* topic, const char* json) {
+  return Push(context, topic, kJson, json);
 }
 
-int32_t qxskylane_push_bin(QxskylaneContext* context, const char*, const void*, uint64_t) {
-  return NotSupported(context, L"qxskylane_push_bin");
+int32_t qxskylane_push_bin(QxskylaneContext* context, const char* topic, const void* bytes, uint64_t size) {
+  return Push(context, topic, kBytes, bytes, size);
 }
 
-int32_t qxskylane_ask(QxskylaneContext* context, const char*, const char*, QxskylaneResponse** response) {
-  return NotSupported(context, L"qxskylane_ask", response);
+int32_t qxskylane_ask(QxskylaneContext* context, const char* topic, const char* text, QxskylaneResponse** response) {
+  return Ask(context, response, topic, kText, text);
 }
 
-int32_t qxskylane_ask_json(QxskylaneContext* context, const char*, const char*, QxskylaneResponse** response) {
-  return NotSupported(context, L"qxskylane_ask_json", response);
+int32_t qxskylane_ask_json(QxskylaneContext* context, const char* topic, const char* json,
+                           QxskylaneResponse** response) {
+  return Ask(context, response, topic, kJson, json);
 }
 
-int32_t qxskylane_ask_bin(QxskylaneContext* context, const char*, const void*, uint64_t, QxskylaneResponse** response) {
-  return NotSupported(context, L"qxskylane_ask_bin", response);
+int32_t qxskylane_ask_bin(QxskylaneContext* context, const char* topic, const void* bytes, uint64_t size,
+                          QxskylaneResponse** response) {
+  return Ask(context, response, topic, kBytes, bytes, size);
 }
 
-int32_t qxskylane_ask_async(QxskylaneContext* context, const char*, const char*, QxskylaneDone done, void*) {
-  return NotSupported(context, L"qxskylane_ask_async", done);
+int32_t qxskylane_ask_async(QxskylaneContext* context, const char* topic, const char* text, QxskylaneDone done,
+                            void* user) {
+  return AskLater(context, done, user, true, topic, kText, text);
 }
 
-int32_t qxskylane_ask_json_async(QxskylaneContext* context, const char*, const char*, QxskylaneDone done, void*) {
-  return NotSupported(context, L"qxskylane_ask_json_async", done);
+int32_t qxskylane_ask_json_async(QxskylaneContext* context, const char* topic, const char* json, QxskylaneDone done,
+                                 void* user) {
+  return AskLater(context, done, user, true, topic, kJson, json);
 }
 
-int32_t qxskylane_ask_bin_async(QxskylaneContext* context, const char*, const void*, uint64_t, QxskylaneDone done,
-                                void*) {
-  return NotSupported(context, L"qxskylane_ask_bin_async", done);
+int32_t qxskylane_ask_bin_async(QxskylaneContext* context, const char* topic, const void* bytes, uint64_t size,
+                                QxskylaneDone done, void* user) {
+  return AskLater(context, done, user, false, topic, kBytes, bytes, size);
 }
 
-// No function of this version makes a response.
-void qxskylane_free_response(QxskylaneResponse*) {}
+void qxskylane_free_response(QxskylaneResponse* response) {
+  const std::unique_ptr<qxlink::UploadResponse> owner(static_cast<qxlink::UploadResponse*>(response));
+}
 
 const char* qxskylane_text(int32_t result) {
   return qxlink::TextOfResult(result);
@@ -134,22 +196,40 @@ int32_t qxskylane_get_option(QxskylaneContext* context, int32_t option, int64_t*
 }
 
 int32_t qxskylane_file_upload(QxskylaneContext* context, const QxskylaneUpload* upload) {
-  return WithRequest(context, upload, [&](const UploadRequest& request) { return context->UploadFile(request); });
+  return WithRequest(context, upload, [&](const UploadRequest& request) {
+    UploadAnswer answer;
+    return context->UploadFile(request, answer);
+  });
 }
 
-int32_t qxskylane_file_upload_async(QxskylaneContext* context, const QxskylaneUpload*, QxskylaneDone done, void*) {
-  return NotSupported(context, L"qxskylane_file_upload_async", done);
+int32_t qxskylane_file_upload_async(QxskylaneContext* context, const QxskylaneUpload* upload, QxskylaneDone done,
+                                    void* user) {
+  if (done == nullptr) return QXSKYLANE_BAD_ARGUMENT;
+  return WithRequest(context, upload, [&](const UploadRequest& request) -> int32_t {
+    context->Begin([context, request](UploadAnswer& answer) { return context->UploadFile(request, answer); }, done,
+                   user);
+    return QXSKYLANE_OK;
+  });
 }
 
 int32_t qxskylane_mem_upload(QxskylaneContext* context, const QxskylaneUpload* upload, const void* bytes,
                              uint64_t size) {
   if (bytes == nullptr && size != 0) return QXSKYLANE_BAD_ARGUMENT;
   const std::string_view view(static_cast<const char*>(bytes), static_cast<size_t>(size));
-  return WithRequest(context, upload,
-                     [&](const UploadRequest& request) { return context->UploadMemory(request, view); });
+  return WithRequest(context, upload, [&](const UploadRequest& request) {
+    UploadAnswer answer;
+    return context->UploadMemory(request, view, answer);
+  });
 }
 
-int32_t qxskylane_mem_upload_async(QxskylaneContext* context, const QxskylaneUpload*, const void*, uint64_t,
-                                   QxskylaneDone done, void*) {
-  return NotSupported(context, L"qxskylane_mem_upload_async", done);
+int32_t qxskylane_mem_upload_async(QxskylaneContext* context, const QxskylaneUpload* upload, const void* bytes,
+                                   uint64_t size, QxskylaneDone done, void* user) {
+  if (done == nullptr || (bytes == nullptr && size != 0)) return QXSKYLANE_BAD_ARGUMENT;
+  const std::string_view view(static_cast<const char*>(bytes), static_cast<size_t>(size));
+  return WithRequest(context, upload, [&](const UploadRequest& request) -> int32_t {
+    context->Begin(
+        [context, request, view](UploadAnswer& answer) { return context->UploadMemory(request, view, answer); }, done,
+        user);
+    return QXSKYLANE_OK;
+  });
 }

@@ -12,7 +12,9 @@ A row is a function that takes a Bench and yields Lines, and one line in ROWS.
 """
 import argparse
 import difflib
+import json
 import os
+import random
 import re
 import shutil
 import statistics
@@ -24,6 +26,10 @@ from typing import NamedTuple
 import make_corpus
 
 ROOT = os.path.dirname(os.path.dirname(os.path.dirname(os.path.abspath(__file__))))
+sys.path.insert(0, f"{ROOT}/tests/support")
+
+import ingest  # noqa: E402  (of the tests: the receiving server)
+
 FOLDER = f"{ROOT}/build/bench"
 SESSION = f"{ROOT}/tools/wine_session.sh"
 MIB = 1 << 20
@@ -250,6 +256,60 @@ def event_queue(bench):
         raise RuntimeError(f"of all runs only {middle['queue', 'runs']:.2f} came")
 
 
+def upload(bench):
+    size = 50 * MIB
+    stage = f"{FOLDER}/upload"
+    shutil.rmtree(stage, ignore_errors=True)
+    os.makedirs(stage)
+    for name in ("upload_child.exe", "qxlink.dll", "log.dll"):
+        shutil.copy(f"{bench.programs}/{name}", stage)
+    with open(f"{stage}/package.zip", "wb") as file:
+        file.write(random.Random(50).randbytes(size))
+    subprocess.run([f"{ROOT}/tools/ingest/install.sh"], check=True, stdout=subprocess.DEVNULL)
+
+    def ours(*options):
+        output = bench.output(["wine", f"{stage}/upload_child.exe", f"{stage}/package.zip", *options])
+        if "result=0 " not in output:
+            raise RuntimeError(f"the upload failed: {output}")
+        return output
+
+    def our_speed():
+        return size / float(re.search(r"seconds=([0-9.]+)", ours()).group(1))
+
+    with ingest.IngestServer(f"{stage}/server") as server:
+        address = f"http://localhost:{server.port}/files"
+        with open(f"{stage}/qxlink.json", "w", encoding="utf-8") as file:
+            json.dump({"endpoint": address, "allow_plain_http": True, "proxy": "none"}, file)
+        with open(f"{stage}/package.zip", "rb") as file:
+            data = file.read()
+        client = ingest.TusClient(server.port)
+        metadata = ingest.metadata_for(data)
+
+        def peer_speed():
+            _, location, _ = client.create(data, metadata)
+            output = subprocess.run(
+                ["curl", "--silent", "--fail", "--noproxy", "*", "--output", os.devnull, "--write-out", "%{speed_upload}",
+                 "--request", "PATCH", "--header", "Tus-Resumable: 1.0.0", "--header", "Upload-Offset: 0", "--header",
+                 "Content-Type: application/offset+octet-stream", "--upload-file", f"{stage}/package.zip",
+                 f"http://localhost:{server.port}{location}"], check=True, text=True, stdout=subprocess.PIPE).stdout
+            return float(output)
+
+        our_speed(), peer_speed()
+        pairs = [(our_speed(), peer_speed()) if index % 2 else (peer_speed(), our_speed())[::-1]
+                 for index in range(bench.rounds)]
+        own, other = (statistics.median(side) / MIB for side in zip(*pairs))
+        # Of speeds, the larger is the better: the line shows the peer's time as it shows it for all jobs.
+        yield Line("upload", f"{own:.0f} MiB/s", f"{other:.0f} MiB/s",
+                   statistics.median(peer / mine for mine, peer in pairs), 1 / 0.9)
+
+        def peak(*options):
+            return int(re.search(r"peak_memory=(\d+)", ours(*options)).group(1))
+
+        over = max(peak() for _ in range(3)) - min(peak("idle") for _ in range(3))
+        yield Line("  peak memory", f"{over / MIB:.1f} MiB", "-", None, 16, over / MIB)
+    shutil.rmtree(stage)
+
+
 ROWS = {
     "pack-mixed": ("50 MiB in 400 mixed files, against zip -6", pack("mixed", 0.60, 1.02)),
     "pack-small": ("38 MiB in 10,000 files, against zip -6", pack("small", 0.90, 1.02)),
@@ -262,6 +322,7 @@ ROWS = {
     "product-files": ("version and MD5 of 500 libraries, 400 MB, against openssl md5", product_files),
     "events": ("20,000 event records to a JSON file, against Json::StyledWriter; memory over the document", events),
     "event-queue": ("1,000 items of 10 ms: median error of the period, and processors taken; against a thread for each", event_queue),
+    "upload": ("50 MiB to a tus server on loopback, against one PATCH by curl; its peak memory over idle", upload),
     "start": ("start, first log lines, end; against an empty GUI program", start),
 }
 
