@@ -1,5 +1,7 @@
 #include "stutil/package_writer.h"
 
+#include <mutex>
+
 namespace stutil {
 namespace {
 
@@ -17,8 +19,18 @@ PackageWriter::~PackageWriter() {
 }
 
 void PackageWriter::SetReady(size_t count) {
-  m_ready.store(count, std::memory_order_release);
-  m_ready.notify_one();
+  {
+    const std::lock_guard lock(m_lock);
+    m_ready = count;
+  }
+  WakeConditionVariable(&m_changed);
+}
+
+size_t PackageWriter::WaitForMoreThan(size_t written) {
+  const std::lock_guard lock(m_lock);
+  while (m_ready == written)
+    m_lock.Wait(m_changed);
+  return m_ready;
 }
 
 DWORD PackageWriter::Finish() {
@@ -35,8 +47,7 @@ void PackageWriter::Run() {
 DWORD PackageWriter::WriteBody() {
   size_t flushed = 0;
   for (size_t written = 0; written < m_body.size();) {
-    m_ready.wait(written, std::memory_order_acquire);
-    const size_t ready = m_ready.load(std::memory_order_acquire);
+    const size_t ready = WaitForMoreThan(written);
     if (ready == kAbandoned) return ERROR_OPERATION_ABORTED;
     DWORD error = m_file.Write(m_body.substr(written, ready - written));
     written = ready;

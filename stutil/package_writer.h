@@ -3,13 +3,13 @@
 
 #include <windows.h>
 
-#include <atomic>
 #include <cstddef>
 #include <string>
 #include <string_view>
 #include <thread>
 
 #include "core/files.h"
+#include "core/lock.h"
 
 namespace stutil {
 
@@ -31,13 +31,16 @@ class PackageWriter {
 
  private:
   void Run();
+  size_t WaitForMoreThan(size_t written);
   DWORD WriteBody();
   void Join();
 
   const std::string_view m_head;
   const std::string_view m_body;
   PartialFile m_file;
-  std::atomic<size_t> m_ready{0};
+  SharedLock m_lock;
+  CONDITION_VARIABLE m_changed = CONDITION_VARIABLE_INIT;
+  size_t m_ready = 0;             // guarded by m_lock
   DWORD m_error = ERROR_SUCCESS;  // the thread's, until it is joined
   std::thread m_thread;           // last: it uses all of the above
 };
