@@ -1,6 +1,6 @@
 // The C interface of the cloud communication library, `qxlink.dll`: it uploads files, or puts them into an outbox
 // folder where no service is configured, and exchanges short messages with the service. What it uploads to is said by
-// its own configuration, `qxlink.json` beside the library (docs/formats.md), not by the program.
+// its own configuration, `qxlink.json` beside the library (docs/delivery.md), not by the program.
 //
 // Text is UTF-8 and zero-terminated. What a caller hands over is only borrowed for the call; asynchronous functions
 // copy what they need before they return, except for the bytes of qxskylane_mem_upload_async and

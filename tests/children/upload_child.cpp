@@ -8,8 +8,8 @@
 //   end=N        ends the context N milliseconds after an asynchronous call
 //   ask          asks the service {"q":1} under the topic "status" instead, and says the answer
 //   idle         does everything but the upload: for comparing memory
-// prints: "option=R", "answer=S BODY", "begun=R", "done=R status=S location=L", "result=R sent=BYTES total=BYTES", "seconds=…
-// peak_memory=…"; the time is that from the first byte to the answer to the last.
+// prints: "option=R", "answer=S BODY", "begun=R", "done=R status=S location=L", "result=R sent=BYTES total=BYTES",
+// "seconds=… peak_memory=…"; the time is that from the first byte to the answer to the last.
 #include <windows.h>
 
 #include <psapi.h>
@@ -118,8 +118,8 @@ class Uploader {
 
   int32_t Ask() const {
     QxskylaneResponse* response = nullptr;
-    const int32_t result = Get<decltype(&qxskylane_ask_json)>("qxskylane_ask_json")(m_context, "status", R"({"q":1})",
-                                                                                    &response);
+    const int32_t result =
+        Get<decltype(&qxskylane_ask_json)>("qxskylane_ask_json")(m_context, "status", R"({"q":1})", &response);
     if (response != nullptr) {
       std::printf("answer=%u %s\n", response->http_status, static_cast<const char*>(response->body));
     }
