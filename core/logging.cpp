@@ -123,7 +123,7 @@ void Route::Capture(const wchar_t* function, const wchar_t* format, ...) const n
   va_end(arguments);
 }
 
-ErrorCapture::ErrorCapture(Level least) : m_least(least) {
+ErrorCapture::ErrorCapture(Level least, Keep keep) : m_least(least), m_keep(keep) {
   ChangeListeners([this] { m_outer = std::exchange(g_capture, this); });
 }
 
@@ -133,6 +133,7 @@ ErrorCapture::~ErrorCapture() {
 
 void ErrorCapture::Add(const std::wstring& line) {
   const std::lock_guard lock(m_mutex);
+  if (m_keep == Keep::kLast) m_lines.clear();
   if (m_lines.size() < kMostLines) {
     m_lines.push_back(line);
   } else {

@@ -81,7 +81,9 @@ bool IsEnabled();
 // reverse order of their making.
 class ErrorCapture {
  public:
-  explicit ErrorCapture(Level least = Level::kError);
+  enum class Keep { kFirst, kLast };  // the first kMostLines lines, or only the last one
+
+  explicit ErrorCapture(Level least = Level::kError, Keep keep = Keep::kFirst);
   ~ErrorCapture();
   ErrorCapture(const ErrorCapture&) = delete;
   ErrorCapture& operator=(const ErrorCapture&) = delete;
@@ -98,6 +100,7 @@ class ErrorCapture {
   void Add(const std::wstring& line);
 
   const Level m_least;
+  const Keep m_keep;
   ErrorCapture* m_outer = nullptr;  // fixed once this one listens
   std::mutex m_mutex;
   std::vector<std::wstring> m_lines;

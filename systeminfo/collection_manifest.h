@@ -23,7 +23,7 @@ struct CollectorOutcome {
   std::wstring name;       // the settings key and base name of the file
   std::wstring className;  // tells collectors of one name apart
   Outcome outcome = Outcome::kNoData;
-  std::wstring reason;  // why it failed or was not written
+  std::wstring reason;  // why there is no file; empty for kData
   uint64_t records = 0;
   uint64_t bytes = 0;                // of the file
   uint64_t milliseconds = 0;         // collecting and writing

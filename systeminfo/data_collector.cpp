@@ -67,9 +67,13 @@ struct RunContext {
 };
 
 void StartAndWrite(ICollector& collector, const RunContext& context, CollectorOutcome& outcome) {
+  // A collector that finds nothing says so, or why, with its last line, of whatever level.
+  logging::ErrorCapture lastLine(logging::Level::kTrace, logging::ErrorCapture::Keep::kLast);
   collector.Start(context.settings, context.wmi, context.cancel);
   const Json::Value& data = collector.Data();
   if (data.isNull()) {
+    const std::vector<std::wstring> said = lastLine.Take();
+    outcome.reason = said.empty() ? L"nothing was found" : said.back();
     LOG_TRACE(kRunCollectors, L"No data collected for %s", outcome.name.c_str());
     return;
   }

@@ -115,6 +115,19 @@ TEST_F(Run, CollectorWithoutDataWritesNoFileAndCountsAsProgress) {
   EXPECT_THAT(m_progress, ElementsAre(Pair(1, 2), Pair(2, 2)));
   EXPECT_THAT(m_log.Take(), Contains(L"systeminfo::DataCollectorImpl::RunCollectors: No data collected for none"));
   EXPECT_EQ(m_runner.Outcomes()[0].outcome, Outcome::kNoData);
+  EXPECT_EQ(m_runner.Outcomes()[0].reason, L"nothing was found");
+  EXPECT_EQ(m_runner.Outcomes()[1].reason, L"");
+}
+
+TEST_F(Run, WhatACollectorWithoutDataSaidLastIsItsReason) {
+  const auto silent = std::make_shared<FakeCollector>(L"silent", [](WMIWrapper&) {
+    LOG_WARNING(L"Start", L"the door is closed");
+    LOG_TRACE(L"Start", L"there is no product");
+    return Json::Value();
+  });
+  EXPECT_EQ(Collect({{silent, L"FakeCollector"}, Fake(L"none", Json::Value())}), 0);
+  EXPECT_EQ(m_runner.Outcomes()[0].reason, L"Start: there is no product");
+  EXPECT_EQ(m_runner.Outcomes()[1].reason, L"nothing was found");
 }
 
 TEST_F(Run, ThrowingCollectorIsLoggedAndTheRunGoesOn) {

@@ -109,6 +109,22 @@ class WindowsEvents(ProgramTest):
                 self.stage.clear()
 
 
+class AllCollectors(ProgramTest):
+    """Everything that the program can collect of this machine."""
+
+    def test_each_collector_writes_its_file_or_the_manifest_says_why_not(self):
+        self.stage.settings({"all_collectors": True})
+        log = self.stage.collect("nocs", "nodtf", "noe")
+        self.assertReturnCode(log, 0)
+        manifest = json.loads(self.stage.path("collected/collection_manifest.json").read_bytes())
+        self.assertEqual(len(manifest["collectors"]), 16)
+        for entry in manifest["collectors"]:
+            with self.subTest(collector=entry["class"]):
+                written = self.stage.path(f"collected/{entry['name']}.json").exists()
+                self.assertEqual(written, entry["outcome"] == "data", entry)
+                self.assertEqual("reason" in entry, not written, entry)
+
+
 class CleanUp(ProgramTest):
     """What is left of a run, for the four ways to delete, when it succeeds and when the submission fails."""
 

@@ -212,6 +212,7 @@ class ShippedSettings(ProgramTest):
         log = self.stage.collect("nocs", "nodtf", "noe", *options)
         self.assertReturnCode(log, 0)
         self.assertNotIn("Expecting a string with file name", log)
+        self.assertNotIn("names no collector", log)
         return log
 
     def test_the_full_collection_runs_from_its_folder_and_as_the_default(self):

@@ -74,7 +74,7 @@ class TableCollectors(ProgramTest):
                 else:
                     self.assertEqual(entry["outcome"], "no data")
                     self.assertFalse(path.exists())
-                    self.assertTrue(entry["errors"])
+                    self.assertTrue(entry["reason"])
                     self.assertIn(f"No data collected for {entry['name']}", self.log)
 
     def test_rows_have_all_members_and_no_others(self):
