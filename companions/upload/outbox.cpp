@@ -175,7 +175,7 @@ std::vector<std::wstring> FilesInOutbox(const std::wstring& folder) {
     if (name.ends_with(kPartialSuffix)) continue;
     const bool isDescription =
         name.ends_with(kDescriptionSuffix) && names.count(name.substr(0, name.size() - kDescriptionSuffix.size())) != 0;
-    if (!isDescription) paths.push_back(folder + L'\\' + name);
+    if (!isDescription) paths.emplace_back(folder + L'\\').append(name);
   }
   return paths;  // their names begin with the time
 }
