@@ -12,6 +12,10 @@
 
 namespace {
 
+// Milliseconds: of one pause, and of all pauses of one removal together.
+constexpr DWORD kWaitingStep = 10;
+constexpr DWORD kMostWaiting = 1000;
+
 using RemoveFunction = BOOL(WINAPI*)(const wchar_t*);
 
 bool Remove(RemoveFunction remove, const std::wstring& path, bool force) {
@@ -42,7 +46,7 @@ class TreeRemoval {
       Level& level = m_levels.back();
       m_path.resize(level.pathLength);
       if (level.subfolders.empty()) {
-        m_isComplete &= Remove(RemoveDirectoryW, m_path, m_force);
+        m_isComplete = RemoveEmptied() && m_isComplete;
         m_levels.pop_back();
       } else {
         m_path += L'\\';
@@ -59,6 +63,19 @@ class TreeRemoval {
     size_t pathLength;
     std::vector<std::wstring> subfolders;  // names, still to be removed
   };
+
+  // What somebody else looks at right now, an indexer or a virus scanner, stands until it lets go, and its folder is
+  // not empty so long. That is waited for, but not when something of the tree stays anyway.
+  bool RemoveEmptied() {
+    for (;;) {
+      if (Remove(RemoveDirectoryW, m_path, m_force)) return true;
+      const DWORD error = GetLastError();
+      const bool isInUse = error == ERROR_DIR_NOT_EMPTY || error == ERROR_SHARING_VIOLATION;
+      if (!isInUse || !m_isComplete || m_waited >= kMostWaiting) return false;
+      Sleep(kWaitingStep);
+      m_waited += kWaitingStep;
+    }
+  }
 
   // Removes what is not a subfolder from the folder `m_path`, and notes its subfolders.
   void EnterCurrentFolder() {
@@ -81,6 +98,7 @@ class TreeRemoval {
   std::wstring m_path;
   bool m_force;
   bool m_isComplete = true;
+  DWORD m_waited = 0;  // milliseconds, in all
   std::vector<Level> m_levels;
 };
 

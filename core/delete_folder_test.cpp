@@ -3,6 +3,7 @@
 #include <gtest/gtest.h>
 
 #include <string>
+#include <thread>
 
 #include "core/scoped.h"
 #include "tests/support/folder_link.h"
@@ -81,6 +82,21 @@ TEST(DeleteFolder, LinkIsRemovedButNotWhatItLeadsTo) {
   EXPECT_EQ(PathExists(folder.Path(L"tree")), !link.IsRemovable());
   EXPECT_FALSE(PathExists(folder.Path(L"tree\\file")));
   EXPECT_TRUE(PathExists(folder.Path(L"elsewhere\\kept")));
+}
+
+TEST(DeleteFolder, AFolderThatSomebodyLooksAtGoesWhenHeLooksAway) {
+  const TestFolder folder;
+  folder.MakeFile(L"tree\\a\\b\\file");
+  WIN32_FIND_DATAW entry;
+  FindHandle look(FindFirstFileW(folder.Path(L"tree\\a\\*").c_str(), &entry));
+  ASSERT_TRUE(look);
+  std::thread onlooker([&look] {
+    Sleep(150);
+    look.Reset();
+  });
+  EXPECT_TRUE(DeleteFolder(folder.Path(L"tree"), false));
+  onlooker.join();
+  EXPECT_FALSE(PathExists(folder.Path(L"tree")));
 }
 
 TEST(DeleteFolder, DeepTreeGoes) {
