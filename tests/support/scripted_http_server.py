@@ -21,16 +21,18 @@ any of these members:
     then                "close" or "reset": ends the connection after the answer
     repeat              how many requests get this reply (1)
 
-"$ORIGIN" in headers, body and raw becomes the server's own "http://localhost:PORT". A recorded request has the members
+"$ORIGIN" in headers, body and raw becomes the server's own "http://localhost:PORT", "$IN2" the HTTP date two seconds from then. A recorded request has the members
 method, target, headers (pairs), body (its first 64 KiB, Latin-1), body_bytes, body_sha256, whole (did all that
 Content-Length promised arrive), connection (number), seconds (since the server started).
 """
 import argparse
 import asyncio
+import email.utils
 import hashlib
 import http
 import json
 import os
+import re
 import ssl
 import time
 
@@ -59,12 +61,17 @@ def expand(script):
     return replies
 
 
+def fill_in(text, origin):
+    text = re.sub(r"\$IN(\d+)", lambda match: email.utils.formatdate(time.time() + int(match.group(1)), usegmt=True), text)
+    return text.replace("$ORIGIN", origin)
+
+
 def render(reply, method, origin):
     """The bytes of a reply to a request with this method."""
     if "raw" in reply:
-        return reply["raw"].replace("$ORIGIN", origin).encode("latin-1")
+        return fill_in(reply["raw"], origin).encode("latin-1")
     status = reply.get("status", 200)
-    body = reply.get("body", "").replace("$ORIGIN", origin).encode("latin-1")
+    body = fill_in(reply.get("body", ""), origin).encode("latin-1")
     headers = reply.get("headers", {})
     pairs = list(headers.items()) if isinstance(headers, dict) else list(headers)
     bodyless = status < 200 or status in (204, 304)
@@ -73,7 +80,7 @@ def render(reply, method, origin):
     known = {code.value: code.phrase for code in http.HTTPStatus}
     reason = reply.get("reason", known.get(status, "Unknown"))
     lines = [f"HTTP/1.1 {status} {reason}", *(f"{name}: {value}" for name, value in pairs), "", ""]
-    head = "\r\n".join(lines).replace("$ORIGIN", origin).encode("latin-1")
+    head = fill_in("\r\n".join(lines), origin).encode("latin-1")
     return head if bodyless or method == "HEAD" else head + body
 
 
