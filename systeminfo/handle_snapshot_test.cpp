@@ -142,7 +142,7 @@ class FakeKernel : public testing::Test {
 TEST_F(FakeKernel, HandleThatFailsOrBlocksCostsOnlyItself) {
   s_handles = 11;
   s_smallestReply = 40000;  // several doublings
-  ProcessHandlerHelper helper(m_calls, std::chrono::milliseconds(50));
+  ProcessHandlerHelper helper(m_calls, std::chrono::milliseconds(250));
   EXPECT_THAT(Values(helper), ElementsAre(1, 2, 4, 6, 8, 10, 11));
   const std::wstring scope = L"ProcessHandlerHelper::GetHandleInformationForProcess: ";
   EXPECT_THAT(m_capture.Take(),
@@ -153,7 +153,7 @@ TEST_F(FakeKernel, HandleThatFailsOrBlocksCostsOnlyItself) {
 TEST_F(FakeKernel, ManyBlockingHandlesEndTheQuestions) {
   s_handles = 1600;  // 16 of them block
   s_smallestReply = 8 + 24 * s_handles;
-  ProcessHandlerHelper helper(m_calls, std::chrono::milliseconds(20));
+  ProcessHandlerHelper helper(m_calls, std::chrono::milliseconds(250));
   const auto values = Values(helper);
   EXPECT_EQ(values.back(), 704u) << "705 is the eighth that blocks";
   EXPECT_THAT(Values(helper), IsEmpty());
