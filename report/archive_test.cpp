@@ -12,7 +12,6 @@ namespace {
 using testing::ElementsAre;
 using testing::HasSubstr;
 using testing::IsEmpty;
-using testing::SizeIs;
 
 constexpr uint32_t kUnixLink = 0120777u << 16;
 constexpr uint32_t kUnixPipe = 0010644u << 16;

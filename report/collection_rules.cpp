@@ -40,9 +40,11 @@ void FindUnwrittenCollectors(const Collection& collection, EvidenceList& found) 
 
 void FindCollectorErrors(const Collection& collection, EvidenceList& found) {
   ForEachCollector(collection, [&](const Json::Value& collector, const std::string& path) {
-    ForEachElement(Member(collector, "errors"), [&](const Json::Value& line, const std::string& index) {
-      if (line.isString()) found.Add(kManifestFile, path + ".errors" + index, TextOf(line));
-    });
+    const Json::Value& errors = Member(collector, "errors");
+    if (!errors.isArray() || errors.empty()) return;
+    const std::string count = errors.size() == 1 ? "1 error" : std::to_string(errors.size()) + " errors, the first";
+    found.Add(kManifestFile, path + ".errors",
+              TextOf(Member(collector, "name")) + ": " + count + ": " + TextOf(errors[0]));
   });
 }
 

@@ -43,6 +43,8 @@ std::vector<SourceFile> ListFolder(const std::wstring& root, std::vector<Evidenc
     files.push_back({std::move(name), size});
     return files.size() < kMostEntries ? kWalkContinue : kWalkStop;
   });
+  if (files.size() == kMostEntries)
+    leftOut.push_back({ToUtf8(root), "", "holds too many files: not all were looked at"});
   return files;
 }
 

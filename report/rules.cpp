@@ -128,7 +128,9 @@ constexpr Rule kRules[] = {
      "The package is damaged or was changed: no collector writes such a file. Ask for a new one.",
      &FindUnreadableDocuments},
     {"entry-left-out", kWarning, "An entry of the archive was left out, as it is not safe",
-     "The support tool writes no such entries. Treat the package as hostile.", &FindLeftOutEntries},
+     "The support tool writes no such names, links or duplicates: treat a package with them as hostile. Of a file that "
+     "is only too large, ask for the file itself.",
+     &FindLeftOutEntries},
 };
 
 }  // namespace

@@ -167,7 +167,7 @@ const RuleRow kRows[] = {
      R"({"collection_manifest": {"collectors": [{"name": "storage", "outcome": "not written"}]}})",
      R"({"collection_manifest": {"collectors": [{"name": "storage", "outcome": "failed"}, null]}})"},
     {"collector-errors",
-     R"({"collection_manifest": {"collectors": [{"name": "storage", "errors": ["Query failed"]}]}})",
+     R"({"collection_manifest": {"collectors": [{"name": "storage", "errors": ["Query failed", "Again"]}]}})",
      R"({"collection_manifest": {"collectors": [{"name": "storage", "errors": []}]}})"},
     {"document-missing", R"({"collection_manifest": {"collectors": [{"name": "printers", "outcome": "data"}]}})",
      R"({"services": [], "collection_manifest": {"collectors": [{"name": "services", "outcome": "data"},
@@ -323,6 +323,7 @@ TEST(Rules, FindingsComeGravestFirst) {
       Parse(R"({"collection_manifest": {"collectors": [{"name": "x", "outcome": "failed", "errors": ["e"]}]},
                 "windows_events": {"System": [{"SourceName": "disk", "EventType": "1"}]}})")));
   std::vector<std::string> ids;
+  ids.reserve(findings.size());
   for (const Finding& finding : findings)
     ids.push_back(finding.rule->id);
   EXPECT_THAT(ids, testing::ElementsAre("storage-errors", "collector-failed", "collector-errors"));

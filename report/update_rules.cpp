@@ -35,24 +35,30 @@ std::string Days(double seconds) {
   return std::to_string(static_cast<int64_t>(std::min(std::floor(seconds / kDay), kMost))) + " days";
 }
 
-}  // namespace
+struct Moment {
+  std::optional<double> Update::*time;
+  const char* path;  // below the update's
+  const char* verb;
+};
 
-void FindOldUpdates(const Collection& collection, EvidenceList& found) {
+void FindOldMoments(const Collection& collection, const Moment& moment, EvidenceList& found) {
   if (!collection.collectedAt) return;
   ForEachUpdate(collection, [&](const Update& update) {
-    if (!update.updated || *collection.collectedAt - *update.updated <= kOldestUpdate) return;
-    found.Add(kProductFile, update.path + ".update.time",
-              update.name + " was updated " + Days(*collection.collectedAt - *update.updated) + " before");
+    const std::optional<double> time = update.*moment.time;
+    if (!time || *collection.collectedAt - *time <= kOldestUpdate) return;
+    found.Add(kProductFile, update.path + moment.path,
+              update.name + moment.verb + Days(*collection.collectedAt - *time) + " before the collection");
   });
 }
 
+}  // namespace
+
+void FindOldUpdates(const Collection& collection, EvidenceList& found) {
+  FindOldMoments(collection, {&Update::updated, ".update.time", " was updated "}, found);
+}
+
 void FindOldUpdateChecks(const Collection& collection, EvidenceList& found) {
-  if (!collection.collectedAt) return;
-  ForEachUpdate(collection, [&](const Update& update) {
-    if (!update.checked || *collection.collectedAt - *update.checked <= kOldestUpdate) return;
-    found.Add(kProductFile, update.path + ".check.time",
-              update.name + " was looked for " + Days(*collection.collectedAt - *update.checked) + " before");
-  });
+  FindOldMoments(collection, {&Update::checked, ".check.time", " was looked for "}, found);
 }
 
 void FindChecksOlderThanUpdates(const Collection& collection, EvidenceList& found) {
