@@ -74,8 +74,8 @@ DWORD LogFile::Open() {
   return m_openError;
 }
 
-// Whether the file of this slot, which gave `error`, belongs to another instance, or to somebody else altogether. It need not
-// be there any more: an instance that rotates moves it aside or deletes it at any moment.
+// Whether the file of this slot, which gave `error`, belongs to another instance, or to somebody else altogether. It
+// need not be there any more: an instance that rotates moves it aside or deletes it at any moment.
 bool LogFile::IsTaken(DWORD error) const {
   return error == ERROR_SHARING_VIOLATION || error == ERROR_ACCESS_DENIED || PathExists(Path(0));
 }

@@ -10,7 +10,7 @@ namespace qxlink {
 namespace {
 
 constexpr uint64_t kLongestTimeout = 86'400;           // seconds
-constexpr uint64_t kLongestUpload = 604'800;        // seconds
+constexpr uint64_t kLongestUpload = 604'800;           // seconds
 constexpr uint64_t kLargestChunk = uint64_t{1} << 30;  // bytes
 constexpr size_t kMostHeaders = 32;
 

@@ -1,0 +1,22 @@
+// Findings as text for people and as JSON for scripts. UTF-8.
+#pragma once
+
+#include <string>
+#include <string_view>
+#include <vector>
+
+#include "report/finding.h"
+
+namespace report {
+
+// One line of text that a terminal shows as it is: control characters, also those of the upper range, and those that
+// turn the direction of writing, become "?". What is no UTF-8 becomes U+FFFD.
+std::string Printable(std::string_view text);
+
+std::string FindingsAsText(const std::vector<Finding>& findings);
+
+// {"findings": [{"id", "severity", "title", "explanation", "count", "evidence": [{"file", "path", "text"}]}]};
+// "count" is that of all evidence, of which the first 20 are shown.
+std::string FindingsAsJson(const std::vector<Finding>& findings);
+
+}  // namespace report

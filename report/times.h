@@ -1,0 +1,21 @@
+// The forms in which a collection's files write a moment, as seconds since 1970-01-01. Pure functions; no clock.
+#pragma once
+
+#include <optional>
+#include <string_view>
+
+namespace report {
+
+inline constexpr double kHour = 3600;
+inline constexpr double kDay = 24 * kHour;
+
+// Local times may be this far from UTC (14 hours east), with an hour of summer time and one to spare.
+inline constexpr double kLocalTimeSlack = 16 * kHour;
+
+// "2024-03-04T09:05:07Z"; nothing for any other text.
+std::optional<double> TimeFromIso(std::string_view text);
+
+// "3/4/2024 09:05:07", the month first: the event log's local time, taken as if it were UTC.
+std::optional<double> TimeFromEvent(std::string_view text);
+
+}  // namespace report
