@@ -35,12 +35,6 @@ void NoGui(const ArgumentMap& arguments) {
   }
 }
 
-void WithGui(const ArgumentMap&) {
-  constexpr wchar_t kScope[] = L"WithGui";
-  const logging::ScopeTrace trace(kScope);
-  LOG_ERROR(kScope, L"the interactive mode is not part of this build; use nogui");
-}
-
 void Testing() {
   constexpr wchar_t kScope[] = L"Testing";
   const logging::ScopeTrace trace(kScope);
