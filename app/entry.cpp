@@ -16,6 +16,7 @@
 #include "core/logging.h"
 #include "core/scope_trace.h"
 #include "core/scoped.h"
+#include "stutil/product_logging.h"
 
 namespace {
 
@@ -58,6 +59,7 @@ void Run(const wchar_t* commandLine) {
     LOG_TRACE(kScope, L"Not a single instance");
     return;
   }
+  stutil::RestoreProductLogging();  // a run that was killed may have left it raised
   RunMode(commandLine);
 }
 

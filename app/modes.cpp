@@ -37,12 +37,6 @@ void NoGui(const ArgumentMap& arguments) {
   }
 }
 
-void WithGui(const ArgumentMap&) {
-  constexpr wchar_t kScope[] = L"WithGui";
-  const logging::ScopeTrace trace(kScope);
-  LOG_ERROR(kScope, L"the interactive mode is not part of this build; use nogui");
-}
-
 void Testing() {
   const logging::ScopeTrace trace(L"Testing");
   st::monitoring::MonitoringManager manager(L"monitoring.json");

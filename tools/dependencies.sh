@@ -26,7 +26,7 @@ fetch() {
            -o "Dir::State::Lists=$PWD/apt/lists" -o APT::Sandbox::User=root)
   say "reading the list of source packages"
   apt-get "${options[@]}" update -qq
-  for package in libjsoncpp tinyxml2 libdeflate pytorch; do
+  for package in libjsoncpp libyaml tinyxml2 libdeflate pytorch; do
     say "fetching $package"
     apt-get "${options[@]}" source --download-only --only-source --tar-only -qq "$package" > /dev/null
   done
@@ -67,12 +67,14 @@ build() { # NAME SOURCE [cmake options]
 
 rm -rf build install
 unpack jsoncpp libjsoncpp
+unpack yaml libyaml
 unpack tinyxml2 tinyxml2
 unpack libdeflate libdeflate
 unpack miniz pytorch --strip-components=3 --wildcards '*/third_party/miniz-3.0.2/*'
 
 build jsoncpp source/jsoncpp -DJSONCPP_WITH_TESTS=OFF -DJSONCPP_WITH_POST_BUILD_UNITTEST=OFF \
   -DJSONCPP_WITH_PKGCONFIG_SUPPORT=OFF -DBUILD_OBJECT_LIBS=OFF -DBUILD_STATIC_LIBS=ON
+build yaml source/yaml -DBUILD_TESTING=OFF
 build tinyxml2 source/tinyxml2 -Dtinyxml2_BUILD_TESTING=OFF
 build libdeflate source/libdeflate -DLIBDEFLATE_BUILD_SHARED_LIB=OFF -DLIBDEFLATE_BUILD_GZIP=OFF
 build miniz "$source_root/cmake/dependencies/miniz" -DMINIZ_SOURCE="$PWD/source/miniz"

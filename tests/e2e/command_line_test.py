@@ -6,19 +6,32 @@ from support_tool import BIN, LIBRARIES, TIMEOUT, ProgramTest, bulky_installer_l
 
 
 class StartUp(ProgramTest):
-    def test_modes_that_this_build_lacks_say_so_and_end(self):
-        for arguments in ((), ("NoGui", "c")):
-            with self.subTest(arguments=arguments):
-                log = self.stage.run(*arguments)
-                self.assertInOrder(log, "-> WithGui()", "the interactive mode is not part of this build", "<- WithGui()")
-        self.assertEqual(self.stage.left(), [])
-
     def test_both_names_of_the_monitoring_mode_start_it(self):
         for arguments in (("/m",), ("--monitoring",)):
             with self.subTest(arguments=arguments):
                 log = self.stage.run(*arguments)
                 self.assertInOrder(log, "-> Testing()", "Invalid path for configuration file monitoring.json",
                                    "<- Testing()")
+        self.assertEqual(self.stage.left(), [])
+
+    def test_without_an_html_engine_the_window_mode_ends_with_minus_one(self):
+        before = self.stage.left()
+        for arguments in ((), ("NoGui", "c")):
+            with self.subTest(arguments=arguments):
+                log = self.stage.run(*arguments, code=-1)
+                self.assertInOrder(log, "-> WithGui()", "the HTML engine sciter.dll cannot be loaded, error 126")
+        self.assertEqual(self.stage.left(), before)
+
+    def test_logging_that_a_killed_run_left_raised_is_put_back_at_the_start(self):
+        settings = self.stage.path("Logger.xml")
+        marker = self.stage.path("Logger.xml.raised")
+        before = settings.read_bytes()
+        settings.write_bytes(before.replace(b"</maxSize>", b"</maxSize><depth>MODULE</depth>"))
+        marker.write_bytes(b'{"components":[],"logger_xml_bytes":%d}\n%b' % (len(before), before))
+        self.stage.run("nogui")
+        self.assertNotIn(b"MODULE", settings.read_bytes())
+        self.assertFalse(marker.exists())
+        settings.write_bytes(before)
 
     def test_nogui_without_a_job_does_nothing(self):
         log = self.stage.run("nogui")
@@ -43,7 +56,7 @@ class StartUp(ProgramTest):
 
     def test_empty_command_line_and_known_options_make_no_warning(self):
         for arguments in ((), ("nogui", "-nocs", "/o=x", "--pk=k")):
-            log = self.stage.run(*arguments)
+            log = self.stage.run(*arguments, code=0 if arguments else -1)
             self.assertNotIn("unknown option", log)
             self.assertNotIn("is ignored", log)
 
