@@ -9,9 +9,9 @@ namespace qx::gui {
 namespace {
 
 // Reads one message; what is used up of the limits is counted over the whole of it.
-class Reader {
+class ScriptValueReader {
  public:
-  explicit Reader(const HtmlEngineApi& engine) : m_engine(engine) {}
+  explicit ScriptValueReader(const HtmlEngineApi& engine) : m_engine(engine) {}
 
   Value Read(const HtmlValue& value, size_t level) {
     if (level > kMostMessageLevels) throw ConversionError("The message is nested too deeply.");
@@ -41,7 +41,7 @@ class Reader {
  private:
   // The engine's visitor may not be thrown through.
   struct Visit {
-    Reader* reader;
+    ScriptValueReader* reader;
     size_t level;
     Value object = Value::EmptyObject();
     std::exception_ptr failure;
@@ -92,7 +92,7 @@ class Reader {
   }
   Value Object(const HtmlValue& value, size_t level) {
     Visit visit{this, level, Value::EmptyObject(), nullptr};
-    const uint32_t result = m_engine.ValueEnumElements(&value, &Reader::OnMember, &visit);
+    const uint32_t result = m_engine.ValueEnumElements(&value, &ScriptValueReader::OnMember, &visit);
     if (visit.failure) std::rethrow_exception(visit.failure);
     Check(result);
     return std::move(visit.object);
@@ -125,9 +125,9 @@ class Reader {
   size_t m_characters = 0;
 };
 
-class Writer {
+class ScriptValueWriter {
  public:
-  explicit Writer(const HtmlEngineApi& engine) : m_engine(engine) {}
+  explicit ScriptValueWriter(const HtmlEngineApi& engine) : m_engine(engine) {}
 
   void Write(const Value& value, HtmlValue& target, size_t level) const {
     if (level > kMostMessageLevels) throw ConversionError("The value is nested too deeply.");
@@ -199,11 +199,11 @@ bool EngineValue::Invoke(const HtmlValue& argument) const {
 }
 
 Value FromEngine(const HtmlEngineApi& engine, const HtmlValue& value) {
-  return Reader(engine).Read(value, 0);
+  return ScriptValueReader(engine).Read(value, 0);
 }
 
 void ToEngine(const HtmlEngineApi& engine, const Value& value, HtmlValue& target) {
-  Writer(engine).Write(value, target, 0);
+  ScriptValueWriter(engine).Write(value, target, 0);
 }
 
 bool IsScriptFunction(const HtmlEngineApi& engine, const HtmlValue& value) {

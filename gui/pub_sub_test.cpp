@@ -66,6 +66,7 @@ TEST(PubSub, MayBeUsedByManyThreadsAtOnce) {
   std::atomic<int> calls{0};
   bus.Subscribe(L"topic", [&calls](Value&) { ++calls; });
   std::vector<std::thread> threads;
+  threads.reserve(4);
   for (int i = 0; i < 4; ++i) {
     threads.emplace_back([&bus] {
       for (int j = 0; j < 1000; ++j) {

@@ -99,9 +99,10 @@ void TisWnd::TisSelectIssue(qx::Value& message) {
 void TisWnd::TisStartIssueReproduction(qx::Value& message) {
   constexpr wchar_t kScope[] = L"TisWnd::TisStartIssueReproduction";
   SetSuccess(message, false);
-  m_isReproducing = true;  // half of it may have been raised even when it fails
+  m_isReproducing = true;  // before it: half of it may be raised even when it fails
   if (!m_services.activateLogging()) {
     LOG_ERROR(kScope, L"Could not activate product logging");
+    RestoreLogging();
     return;
   }
   StoreInIssue(L"reproduce_start_time", SecondsSince1970());

@@ -133,6 +133,7 @@
       button.disabled = false;
       if (!answer.success) {
         setMessage("reproduce-message", isStart ? "reproduce_start_failed" : "reproduce_stop_failed");
+        byId("reproduce-next").disabled = false; // sending switches it off too
       } else {
         report.recorded = report.recorded || !isStart;
         setRecording(isStart);

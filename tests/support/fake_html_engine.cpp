@@ -93,11 +93,7 @@ struct FakeHtmlEngineTable {
     return HTML_VALUE_OK;
   }
   static uint32_t CALLBACK IntDataSet(HtmlValue* value, int32_t data, uint32_t type, uint32_t unit) {
-    Node& node = Put(value);
-    node.type = type;
-    node.unit = unit;
-    node.number = data;
-    return HTML_VALUE_OK;
+    return FloatDataSet(value, data, type, unit);
   }
   static uint32_t CALLBACK FloatData(const HtmlValue* value, double* data) {
     if (Get(value).type != HTML_VALUE_FLOAT) return HTML_VALUE_INCOMPATIBLE_TYPE;
@@ -278,6 +274,28 @@ const FakeHtmlEngine::Node& FakeHtmlEngine::Of(const HtmlValue& value) const {
 
 void FakeHtmlEngine::Clear(HtmlValue& value) {
   FakeHtmlEngineTable::Clear(&value);
+}
+
+Node::Node() = default;
+Node::Node(const Node& other) = default;
+Node::Node(Node&& other) noexcept = default;
+Node& Node::operator=(const Node& other) = default;
+Node& Node::operator=(Node&& other) noexcept = default;
+Node::~Node() = default;
+
+Node Node::Int(int value) {
+  Node node;
+  node.type = HTML_VALUE_INT;
+  node.number = value;
+  return node;
+}
+
+Node Node::Callable(Function function) {
+  Node node;
+  node.type = HTML_VALUE_OBJECT;
+  node.unit = HTML_OBJECT_FUNCTION;
+  node.function = std::move(function);
+  return node;
 }
 
 Node Node::From(const qx::Value& value) {

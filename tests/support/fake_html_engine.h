@@ -27,11 +27,17 @@ class FakeHtmlEngine {
     std::vector<std::pair<std::wstring, Node>> members;
     Function function;
 
+    // Out of line: the members hold the type itself.
+    Node();
+    Node(const Node& other);
+    Node(Node&& other) noexcept;
+    Node& operator=(const Node& other);
+    Node& operator=(Node&& other) noexcept;
+    ~Node();
+
     static Node From(const qx::Value& value);
-    static Node Int(int value) { return {HTML_VALUE_INT, 0, static_cast<double>(value), {}, {}, {}, {}}; }
-    static Node Callable(Function function) {
-      return {HTML_VALUE_OBJECT, HTML_OBJECT_FUNCTION, 0, {}, {}, {}, std::move(function)};
-    }
+    static Node Int(int value);
+    static Node Callable(Function function);
     qx::Value ToValue() const;
   };
 
