@@ -140,6 +140,10 @@ typedef enum HtmlSubsystem {
 typedef void(CALLBACK* HtmlDebugOutput)(void* param, uint32_t subsystem, uint32_t severity, const wchar_t* text,
                                         uint32_t chars);
 
+// An option of this engine only: the browser to use instead of the one that is found. `value` is the full path as a
+// const wchar_t*, or null; it holds for windows that are made afterwards.
+#define HTML_OPTION_BROWSER 0x53540001u
+
 // --- Measuring: one of the first four, or-ed with one of the others
 
 typedef enum HtmlArea {
