@@ -15,10 +15,6 @@ namespace {
 using Clock = DevToolsClient::Clock;
 using Outcome = DevToolsClient::Outcome;
 
-constexpr auto kCommandTimeout = std::chrono::seconds(5);
-constexpr auto kLoadTimeout = std::chrono::seconds(15);
-constexpr auto kScriptTimeout = std::chrono::seconds(15);
-constexpr auto kSlowScriptTimeout = std::chrono::seconds(1);
 constexpr uint64_t kLargestResource = uint64_t{32} << 20;
 
 Json::Value With(const char* name, Json::Value value) {
@@ -41,11 +37,11 @@ bool PageSession::Begin(std::unique_ptr<Transport> transport) {
 }
 
 bool PageSession::Attach() {
-  const auto deadline = Clock::now() + kCommandTimeout;
+  const auto deadline = Clock::now() + m_timeouts.command;
   std::string target;
   while (target.empty() && Clock::now() < deadline) {
     Json::Value result;
-    if (m_client->Call("Target.getTargets", {}, result, kCommandTimeout) != Outcome::kDone) return false;
+    if (m_client->Call("Target.getTargets", {}, result, m_timeouts.command) != Outcome::kDone) return false;
     for (const Json::Value& info : MemberOf(result, "targetInfos")) {
       if (TextOf(info, "type") == "page") target = TextOf(info, "targetId");
     }
@@ -54,7 +50,7 @@ bool PageSession::Attach() {
   Json::Value params = With("targetId", target);
   params["flatten"] = true;
   Json::Value result;
-  if (m_client->Call("Target.attachToTarget", params, result, kCommandTimeout) != Outcome::kDone) return false;
+  if (m_client->Call("Target.attachToTarget", params, result, m_timeouts.command) != Outcome::kDone) return false;
   m_client->UseSession(TextOf(result, "sessionId"));
   return !TextOf(result, "sessionId").empty();
 }
@@ -71,7 +67,7 @@ bool PageSession::Prepare() {
 
 bool PageSession::Command(const char* method, const Json::Value& params) {
   Json::Value result;
-  return m_client->Call(method, params, result, kCommandTimeout) == Outcome::kDone;
+  return m_client->Call(method, params, result, m_timeouts.command) == Outcome::kDone;
 }
 
 bool PageSession::Load(const std::wstring& address) {
@@ -82,9 +78,9 @@ bool PageSession::Load(const std::wstring& address) {
   }
   m_page = *page;
   m_isLoaded = false;
-  const auto deadline = Clock::now() + kLoadTimeout;
+  const auto deadline = Clock::now() + m_timeouts.load;
   Json::Value result;
-  Outcome outcome = m_client->Call("Page.navigate", With("url", page->browserUrl), result, kLoadTimeout);
+  Outcome outcome = m_client->Call("Page.navigate", With("url", page->browserUrl), result, m_timeouts.load);
   const std::string error = TextOf(result, "errorText");
   m_mainFrame = TextOf(result, "frameId");
   if (outcome == Outcome::kDone && error.empty()) {
@@ -310,7 +306,7 @@ std::optional<Json::Value> PageSession::RunByEvaluation(const Json::Value& job) 
   Json::Value params = With("expression", "stEngine.perform(" + WriteCompactJson(job) + ")");
   params["returnByValue"] = true;
   Json::Value answer;
-  const auto timeout = m_isSlow ? kSlowScriptTimeout : kScriptTimeout;
+  const auto timeout = m_isSlow ? m_timeouts.slowScript : m_timeouts.script;
   const Outcome outcome = m_client->Call("Runtime.evaluate", params, answer, timeout);
   if (outcome == Outcome::kTimedOut || outcome == Outcome::kLost) return {};
   const Json::Value& value = MemberOf(MemberOf(answer, "result"), "value");
@@ -322,7 +318,7 @@ std::optional<Json::Value> PageSession::RunByWaitingCall(const Json::Value& job)
   const auto call = m_waiting.back();
   if (call->requestId.empty()) return {};  // a function that it runs has timed out
   Answer(std::exchange(call->requestId, {}), "application/json", WriteCompactJson(With("run", job)));
-  const auto deadline = Clock::now() + (m_isSlow ? kSlowScriptTimeout : kScriptTimeout);
+  const auto deadline = Clock::now() + (m_isSlow ? m_timeouts.slowScript : m_timeouts.script);
   while (!call->outcome && m_client->Drain(deadline)) {
   }
   return std::exchange(call->outcome, {});

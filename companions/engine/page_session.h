@@ -36,9 +36,19 @@ class PageHost {
   virtual void OnNotice(const Json::Value& notice) = 0;   // page_bridge.js says which there are
 };
 
+// How long the browser may take.
+struct PageTimeouts {
+  std::chrono::milliseconds command{5000};
+  std::chrono::milliseconds load{15000};
+  std::chrono::milliseconds script{15000};     // a call into the page
+  std::chrono::milliseconds slowScript{1000};  // the same, after one that was not answered
+};
+
 class PageSession : public FunctionHome, public std::enable_shared_from_this<PageSession> {
  public:
-  PageSession(PageHost& host, std::function<void()> wake) : m_host(host), m_wake(std::move(wake)) {}
+  // `wake` is called on any thread when Drain has something to do.
+  PageSession(PageHost& host, std::function<void()> wake, PageTimeouts timeouts = {})
+      : m_host(host), m_wake(std::move(wake)), m_timeouts(timeouts) {}
 
   // Takes the browser's page over. False after a report.
   bool Begin(std::unique_ptr<Transport> transport);
@@ -84,6 +94,7 @@ class PageSession : public FunctionHome, public std::enable_shared_from_this<Pag
 
   PageHost& m_host;
   const std::function<void()> m_wake;
+  const PageTimeouts m_timeouts;
   std::unique_ptr<DevToolsClient> m_client;
   PageAddress m_page;
   std::string m_mainFrame;
