@@ -1,5 +1,6 @@
 #include "companions/engine/devtools_client.h"
 
+#include <algorithm>
 #include <condition_variable>
 #include <deque>
 #include <mutex>
@@ -77,13 +78,14 @@ struct DevToolsClient::Channel {
       {
         std::unique_lock guard(lock);
         toSend.wait(guard, [&] { return isLost || !outgoing.empty(); });
-        if (outgoing.empty()) return;
+        if (outgoing.empty()) break;
         command = std::move(outgoing.front());
         outgoing.pop_front();
         outgoingBytes -= command.size();
       }
       if (!transport->Send(command, error)) return Lose(error);
     }
+    transport->Close();
   }
 
   void ThreadEnds() {
@@ -116,7 +118,6 @@ DevToolsClient::~DevToolsClient() {
 
 void DevToolsClient::Close() {
   m_channel->Lose(L"the window is closed");
-  m_channel->transport->Close();
   const std::lock_guard guard(m_channel->lock);
   m_channel->incoming.clear();
 }
@@ -140,10 +141,10 @@ uint64_t DevToolsClient::Send(const char* method, const Json::Value& params) {
 
 DevToolsClient::Outcome DevToolsClient::Call(const char* method, const Json::Value& params, Json::Value& result,
                                              Clock::duration timeout) {
-  const auto deadline = Clock::now() + timeout;
+  const auto start = Clock::now();
   const uint64_t id = Send(method, params);
   m_awaited[id];
-  while (!m_awaited[id] && Drain(deadline)) {
+  while (!m_awaited[id] && Drain(std::max(start, m_lastLife) + timeout)) {
   }
   const std::optional<DevToolsMessage> answer = std::move(m_awaited[id]);
   m_awaited.erase(id);

@@ -41,6 +41,10 @@ class DevToolsClient {
   // Sends a command and waits for its answer. Events that come meanwhile are told, which may lead to nested calls.
   Outcome Call(const char* method, const Json::Value& params, Json::Value& result, Clock::duration timeout);
 
+  // The page does something that shows that it does not hang: the waiting times begin anew.
+  void NoteLife() { m_lastLife = Clock::now(); }
+  Clock::time_point LastLife() const { return m_lastLife; }
+
   // Tells what has come. `mayWaitUntil`: until then it waits for at least one message. False when none came.
   bool Drain(std::optional<Clock::time_point> mayWaitUntil = {});
 
@@ -58,6 +62,7 @@ class DevToolsClient {
   Listener m_listener;
   std::string m_sessionId;
   uint64_t m_lastId = 0;
+  Clock::time_point m_lastLife;
   std::map<uint64_t, std::optional<DevToolsMessage>> m_awaited;
 };
 

@@ -1,5 +1,7 @@
 #include "companions/engine/page_session.h"
 
+#include <algorithm>
+
 #include "companions/engine/base64.h"
 #include "companions/engine/console_message.h"
 #include "companions/engine/embedded_text.h"
@@ -256,6 +258,7 @@ void PageSession::OnNativeCall(const std::string& requestId, const Json::Value& 
   ScriptValue result;
   const bool isHandled = m_host.ScriptCall(name, arguments, result);
   m_waiting.pop_back();
+  m_client->NoteLife();
   const Text* error = result.As<Text>();
   Json::Value reply(Json::objectValue);
   if (!isHandled) {
@@ -318,8 +321,9 @@ std::optional<Json::Value> PageSession::RunByWaitingCall(const Json::Value& job)
   const auto call = m_waiting.back();
   if (call->requestId.empty()) return {};  // a function that it runs has timed out
   Answer(std::exchange(call->requestId, {}), "application/json", WriteCompactJson(With("run", job)));
-  const auto deadline = Clock::now() + (m_isSlow ? m_timeouts.slowScript : m_timeouts.script);
-  while (!call->outcome && m_client->Drain(deadline)) {
+  const auto start = Clock::now();
+  const auto timeout = m_isSlow ? m_timeouts.slowScript : m_timeouts.script;
+  while (!call->outcome && m_client->Drain(std::max(start, m_client->LastLife()) + timeout)) {
   }
   return std::exchange(call->outcome, {});
 }

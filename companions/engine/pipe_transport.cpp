@@ -1,4 +1,3 @@
-#include <atomic>
 #include <utility>
 
 #include "companions/engine/transport.h"
@@ -36,8 +35,8 @@ class PipeTransport : public Transport {
     const std::string framed = message + '\0';
     for (size_t sent = 0; sent < framed.size();) {
       DWORD count = 0;
-      if (m_isClosed || !WriteFile(m_toBrowser.Get(), framed.data() + sent, static_cast<DWORD>(framed.size() - sent),
-                                   &count, nullptr)) {
+      if (!WriteFile(m_toBrowser.Get(), framed.data() + sent, static_cast<DWORD>(framed.size() - sent), &count,
+                     nullptr)) {
         error = Format(L"a command cannot be sent to the browser, error %u", GetLastError());
         return false;
       }
@@ -46,18 +45,13 @@ class PipeTransport : public Transport {
     return true;
   }
 
-  // The other process's end breaks what blocks; a handle in use must stay open.
-  void Close() noexcept override {
-    m_isClosed = true;
-    CancelIoEx(m_fromBrowser.Get(), nullptr);
-    CancelIoEx(m_toBrowser.Get(), nullptr);
-  }
+  // Reading may go on; the browser ends when nobody writes to it any more.
+  void Close() noexcept override { m_toBrowser.Reset(); }
 
  private:
   KernelHandle m_fromBrowser;
   KernelHandle m_toBrowser;
   MessageSplitter m_splitter;
-  std::atomic<bool> m_isClosed{false};
   char m_buffer[size_t{64} << 10];
 };
 

@@ -21,7 +21,8 @@ class Transport {
   virtual bool Receive(std::string& message, std::wstring& error) = 0;
   virtual bool Send(const std::string& message, std::wstring& error) = 0;
 
-  // Ends both for good, from any thread. What blocks in them may need the end of the browser to come back.
+  // Says good-bye, on the thread that sends, as its last. What blocks in Receive may need the end of the browser to
+  // come back.
   virtual void Close() noexcept = 0;
 };
 

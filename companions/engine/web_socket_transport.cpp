@@ -2,8 +2,6 @@
 
 #include <winhttp.h>
 
-#include <atomic>
-
 #include "companions/engine/transport.h"
 #include "core/format.h"
 #include "core/text.h"
@@ -23,8 +21,6 @@ using InternetHandle = Scoped<InternetHandleTraits>;
 
 class WebSocketTransport : public Transport {
  public:
-  ~WebSocketTransport() override { WebSocketTransport::Close(); }
-
   bool Connect(const DevToolsAddress& address, std::wstring& error) {
     m_session.Reset(WinHttpOpen(nullptr, WINHTTP_ACCESS_TYPE_NO_PROXY, nullptr, nullptr, 0));
     // Answers may take any time once the connection stands.
@@ -75,16 +71,13 @@ class WebSocketTransport : public Transport {
   }
 
   void Close() noexcept override {
-    // Once only: the handle may still be in use by Receive, which fails from here on.
-    if (m_isClosed.exchange(true)) return;
-    if (m_socket) WinHttpWebSocketShutdown(m_socket.Get(), WINHTTP_WEB_SOCKET_SUCCESS_CLOSE_STATUS, nullptr, 0);
+    WinHttpWebSocketShutdown(m_socket.Get(), WINHTTP_WEB_SOCKET_SUCCESS_CLOSE_STATUS, nullptr, 0);
   }
 
  private:
   InternetHandle m_session;
   InternetHandle m_connection;
   InternetHandle m_socket;
-  std::atomic<bool> m_isClosed{false};
   char m_buffer[size_t{64} << 10];
 };
 
