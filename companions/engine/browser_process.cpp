@@ -1,0 +1,201 @@
+#include "companions/engine/browser_process.h"
+
+#include <bcrypt.h>
+#include <lmcons.h>
+
+#include <chrono>
+#include <vector>
+
+#include "companions/engine/browser_command.h"
+#include "core/delete_folder.h"
+#include "core/files.h"
+#include "core/format.h"
+#include "core/text.h"
+
+namespace engine {
+namespace {
+
+constexpr ULONGLONG kConnectTimeout = 15000;  // milliseconds
+constexpr DWORD kPollInterval = 10;
+constexpr DWORD kEndTimeout = 3000;
+constexpr DWORD kLifeInterval = 4000;  // how often the watching shell is told that this process lives
+constexpr DWORD kPipeSize = 1u << 20;
+
+struct AttributeListTraits {
+  using Type = LPPROC_THREAD_ATTRIBUTE_LIST;
+  static bool IsValid(Type list) { return list != nullptr; }
+  static void Close(Type list) { DeleteProcThreadAttributeList(list); }
+};
+using AttributeList = Scoped<AttributeListTraits>;
+
+std::wstring RandomName() {
+  unsigned char bytes[16] = {};
+  BCryptGenRandom(nullptr, bytes, sizeof bytes, BCRYPT_USE_SYSTEM_PREFERRED_RNG);
+  std::wstring name = L"st-engine-";
+  for (const unsigned char byte : bytes)
+    name += Format(L"%02x", byte);
+  return name;
+}
+
+// A Unix browser refuses to run as root with its sandbox. On Windows it always has one.
+bool IsUnixRoot() {
+  wchar_t name[UNLEN + 1] = {};
+  DWORD size = UNLEN + 1;
+  return GetUserNameW(name, &size) && std::wstring_view(name) == L"root";
+}
+
+bool Touch(const std::wstring& path) {
+  return WriteWholeFile(path, "this process lives") == ERROR_SUCCESS;
+}
+
+}  // namespace
+
+// The ends that the browser inherits.
+struct BrowserProcess::Pipes {
+  KernelHandle readEnd;
+  KernelHandle writeEnd;
+};
+
+bool BrowserProcess::MakeProfile(const std::wstring& program, std::wstring& error) {
+  wchar_t temporary[MAX_PATH + 1] = {};
+  GetTempPathW(MAX_PATH + 1, temporary);
+  // A Unix program needs a folder whose Unix path is known.
+  const std::wstring parent = m_isUnix ? program.substr(0, 2) + L"\\tmp\\" : std::wstring(temporary);
+  m_profile = parent + RandomName();
+  if (const DWORD result = CreatePrivateFolder(m_profile); result != ERROR_SUCCESS) {
+    error = Format(L"the browser's profile folder '%s' cannot be made, error %u", m_profile.c_str(), result);
+    m_profile.clear();
+    return false;
+  }
+  return true;
+}
+
+bool BrowserProcess::Start(const std::wstring& program, bool usePort, std::wstring& error) {
+  m_isUnix = IsUnixProgram(program);
+  m_usesPort = usePort || m_isUnix;
+  m_runsWithoutSandbox = m_isUnix && IsUnixRoot();
+  if (!MakeProfile(program, error) || (m_isUnix && !BeginUnixLife(error))) return false;
+  Pipes pipes;
+  BrowserStart start{program, m_profile, 0, 0, !m_runsWithoutSandbox};
+  if (!m_usesPort) {
+    SECURITY_ATTRIBUTES inherited{sizeof inherited, nullptr, TRUE};
+    if (!CreatePipe(m_fromBrowser.Receive(), pipes.writeEnd.Receive(), &inherited, kPipeSize) ||
+        !CreatePipe(pipes.readEnd.Receive(), m_toBrowser.Receive(), &inherited, kPipeSize)) {
+      error = Format(L"no pipe to the browser, error %u", GetLastError());
+      return false;
+    }
+    SetHandleInformation(m_fromBrowser.Get(), HANDLE_FLAG_INHERIT, 0);
+    SetHandleInformation(m_toBrowser.Get(), HANDLE_FLAG_INHERIT, 0);
+    start.readHandle = reinterpret_cast<uintptr_t>(pipes.readEnd.Get());
+    start.writeHandle = reinterpret_cast<uintptr_t>(pipes.writeEnd.Get());
+  }
+  return CreateInJob(BrowserCommandLine(start), pipes, error);
+}
+
+bool BrowserProcess::CreateInJob(std::wstring commandLine, const Pipes& pipes, std::wstring& error) {
+  m_job.Reset(CreateJobObjectW(nullptr, nullptr));
+  JOBOBJECT_EXTENDED_LIMIT_INFORMATION limits{};
+  limits.BasicLimitInformation.LimitFlags = JOB_OBJECT_LIMIT_KILL_ON_JOB_CLOSE;
+  SetInformationJobObject(m_job.Get(), JobObjectExtendedLimitInformation, &limits, sizeof limits);
+
+  STARTUPINFOEXW startup{};
+  startup.StartupInfo.cb = sizeof startup;
+  // Only the pipes are inherited, whatever else of this process could be.
+  HANDLE inherited[] = {pipes.readEnd.Get(), pipes.writeEnd.Get()};
+  SIZE_T size = 0;
+  InitializeProcThreadAttributeList(nullptr, 1, 0, &size);
+  std::vector<std::byte> memory(size);
+  startup.lpAttributeList = reinterpret_cast<LPPROC_THREAD_ATTRIBUTE_LIST>(memory.data());
+  if (!InitializeProcThreadAttributeList(startup.lpAttributeList, 1, 0, &size)) {
+    error = Format(L"no attribute list for the browser, error %u", GetLastError());
+    return false;
+  }
+  const AttributeList attributes(startup.lpAttributeList);
+  const bool inherits = static_cast<bool>(pipes.readEnd);
+  if (inherits) {
+    UpdateProcThreadAttribute(attributes.Get(), 0, PROC_THREAD_ATTRIBUTE_HANDLE_LIST, inherited, sizeof inherited,
+                              nullptr, nullptr);
+  }
+  PROCESS_INFORMATION process{};
+  const DWORD flags = CREATE_SUSPENDED | CREATE_NO_WINDOW | EXTENDED_STARTUPINFO_PRESENT;
+  if (!CreateProcessW(nullptr, commandLine.data(), nullptr, nullptr, inherits, flags, nullptr, nullptr,
+                      &startup.StartupInfo, &process)) {
+    error = Format(L"the browser cannot be started, error %u", GetLastError());
+    return false;
+  }
+  m_process.Reset(process.hProcess);
+  const KernelHandle thread(process.hThread);
+  if (m_isUnix) return true;  // nothing of it can be held
+  // Without the job a killed program would leave its browser behind.
+  if (!AssignProcessToJobObject(m_job.Get(), m_process.Get())) {
+    error = Format(L"the browser cannot be put into a job, error %u", GetLastError());
+    TerminateProcess(m_process.Get(), 1);
+    return false;
+  }
+  ResumeThread(thread.Get());
+  return true;
+}
+
+bool BrowserProcess::BeginUnixLife(std::wstring& error) {
+  const std::wstring life = m_profile + L".life";
+  m_lifeEnds.Reset(CreateEventW(nullptr, TRUE, FALSE, nullptr));
+  if (!m_lifeEnds || !Touch(life)) {
+    error = L"the browser's profile folder cannot be written into";
+    return false;
+  }
+  m_lifeThread = std::thread([ends = m_lifeEnds.Get(), life] {
+    while (WaitForSingleObject(ends, kLifeInterval) == WAIT_TIMEOUT)
+      Touch(life);
+    DeleteFileW(ExtendedPath(life).c_str());
+  });
+  return true;
+}
+
+bool BrowserProcess::HasEnded() const {
+  if (m_isUnix) return PathExists(m_profile + L".ended");
+  return m_process && WaitForSingleObject(m_process.Get(), 0) == WAIT_OBJECT_0;
+}
+
+std::wstring BrowserProcess::LastWords() const {
+  std::string log;
+  if (ReadWholeFile(m_profile + L"\\browser.log", 1 << 20, log) != ERROR_SUCCESS || log.empty()) return {};
+  return L": " + ToWide(log.substr(0, 500));
+}
+
+std::unique_ptr<Transport> BrowserProcess::Connect(std::wstring& error) {
+  if (!m_usesPort) return MakePipeTransport(std::move(m_fromBrowser), std::move(m_toBrowser));
+  const std::wstring portFile = m_profile + L"\\DevToolsActivePort";
+  for (const ULONGLONG start = GetTickCount64(); GetTickCount64() - start < kConnectTimeout; Sleep(kPollInterval)) {
+    std::string text;
+    if (ReadWholeFile(portFile, 1000, text) == ERROR_SUCCESS) {
+      if (const auto address = ParseActivePort(text)) return ConnectWebSocket(*address, error);
+    }
+    if (HasEnded()) {
+      error = L"the browser ended at once" + LastWords();
+      return nullptr;
+    }
+  }
+  error = L"the browser opens no port" + LastWords();
+  return nullptr;
+}
+
+void BrowserProcess::End() noexcept {
+  if (m_lifeThread.joinable()) {
+    SetEvent(m_lifeEnds.Get());  // the shell ends the browser and deletes the profile when the file has gone
+    m_lifeThread.join();
+  }
+  m_fromBrowser.Reset();
+  m_toBrowser.Reset();
+  if (m_job) TerminateJobObject(m_job.Get(), 1);
+  m_job.Reset();
+  if (m_process) WaitForSingleObject(m_process.Get(), kEndTimeout);
+  m_process.Reset();
+  if (m_profile.empty() || m_isUnix) return;
+  // Its other processes may hold files of the profile for a moment longer.
+  for (const ULONGLONG start = GetTickCount64(); !DeleteFolder(m_profile, true); Sleep(kPollInterval)) {
+    if (GetTickCount64() - start > kEndTimeout) break;
+  }
+  m_profile.clear();
+}
+
+}  // namespace engine

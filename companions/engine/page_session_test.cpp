@@ -1,0 +1,154 @@
+// The engine against browsers that behave badly: copies of engine_peer.exe, over real pipes and with real processes.
+#include "companions/engine/page_session.h"
+
+#include <gmock/gmock.h>
+#include <gtest/gtest.h>
+
+#include "companions/engine/browser_process.h"
+#include "core/program_path.h"
+#include "core/text.h"
+#include "tests/support/test_folder.h"
+
+namespace engine {
+namespace {
+
+using testing::HasSubstr;
+
+constexpr PageTimeouts kShort{std::chrono::milliseconds(1000), std::chrono::milliseconds(1000),
+                              std::chrono::milliseconds(1000), std::chrono::milliseconds(100)};
+
+class RecordingHost : public PageHost {
+ public:
+  Supply LoadData(const std::wstring&) override { return {}; }
+  void DataLoaded(const std::wstring&, const std::string*) override {}
+  bool ScriptCall(const std::string&, const std::vector<ScriptValue>&, ScriptValue&) override { return false; }
+  void Report(HtmlSubsystem, HtmlSeverity severity, const std::wstring& text) override {
+    if (severity == HTML_ERROR) reports += ToUtf8(text) + "\n";
+  }
+  void ShowFrame(const std::string& base64) override { frames += base64; }
+  void OnNotice(const Json::Value&) override {}
+
+  std::string reports;
+  std::string frames;
+};
+
+class PageSessionTest : public testing::Test {
+ protected:
+  PageSessionTest() {
+    SetEnvironmentVariableW(L"TMP", m_folder.MakeFolder(L"tmp").c_str());
+    m_session = std::make_shared<PageSession>(
+        m_host, [] {}, kShort);
+  }
+  ~PageSessionTest() override {
+    m_session->End();
+    m_browser.End();
+    m_session.reset();
+    SetEnvironmentVariableW(L"TMP", nullptr);
+  }
+
+  bool BeginWith(const wchar_t* manner) {
+    const std::wstring peer = m_folder.Path(std::wstring(L"engine_peer_") + manner + L".exe");
+    CopyFileW((ProgramFolder() + L"\\engine_peer.exe").c_str(), peer.c_str(), FALSE);
+    std::wstring error;
+    if (!m_browser.Start(peer, false, error)) throw std::runtime_error(ToUtf8(error));
+    return m_session->Begin(m_browser.Connect(error));
+  }
+
+  size_t ProfileCount() const {
+    WIN32_FIND_DATAW data{};
+    const FindHandle find(FindFirstFileW(m_folder.Path(L"tmp\\st-engine-*").c_str(), &data));
+    size_t count = find ? 1 : 0;
+    while (count != 0 && FindNextFileW(find.Get(), &data))
+      ++count;
+    return count;
+  }
+
+  const TestFolder m_folder;
+  RecordingHost m_host;
+  BrowserProcess m_browser;
+  std::shared_ptr<PageSession> m_session;
+  ScriptValue m_result;
+};
+
+TEST_F(PageSessionTest, ABrowserThatIsNoneIsGivenUpWithAReason) {
+  const struct {
+    const wchar_t* manner;
+    const char* reason;
+  } cases[] = {
+      {L"ending", "the browser's pipe has ended"},
+      {L"garbage", "the browser speaks no DevTools protocol"},
+      {L"endless", "the browser sends a message that is too large"},
+      {L"refusing", "Target.getTargets: I will not"},
+      {L"silent", "it does not do what it is told"},
+  };
+  for (const auto& one : cases) {
+    m_host.reports.clear();
+    m_session = std::make_shared<PageSession>(
+        m_host, [] {}, kShort);
+    EXPECT_FALSE(BeginWith(one.manner));
+    EXPECT_THAT(m_host.reports, HasSubstr(one.reason));
+    EXPECT_FALSE(m_session->Load(L"res:page.htm"));
+    m_session->End();
+    m_browser.End();
+    EXPECT_EQ(ProfileCount(), 0u) << one.reason;
+  }
+}
+
+TEST_F(PageSessionTest, NonsenseBetweenTheMessagesDoesNoHarm) {
+  ASSERT_TRUE(BeginWith(L"good"));
+  EXPECT_EQ(ProfileCount(), 1u);
+  ASSERT_TRUE(m_session->Load(L"res:page.htm"));
+  EXPECT_THAT(m_host.reports, HasSubstr("the browser sends what is no message"));
+  EXPECT_EQ(m_host.frames, "!!!");  // decoding is the window's part
+  EXPECT_TRUE(m_session->CallByName("f", {}, m_result));
+  ASSERT_NE(m_result.Find(ScriptValue(Text{L"answer"})), nullptr);
+  EXPECT_FALSE(m_session->CallByName("nothingAsked", {}, m_result));
+  EXPECT_TRUE(m_result.As<Text>()->isError);
+}
+
+TEST_F(PageSessionTest, APageThatNeverLoadsEndsTheWait) {
+  ASSERT_TRUE(BeginWith(L"good"));
+  EXPECT_FALSE(m_session->Load(L"res:never.htm"));
+  EXPECT_THAT(m_host.reports, HasSubstr("'res:never.htm' cannot be loaded: it takes too long"));
+}
+
+TEST_F(PageSessionTest, ABrowserThatDiesInACallEndsTheCall) {
+  ASSERT_TRUE(BeginWith(L"good"));
+  EXPECT_FALSE(m_session->CallByName("pleaseDie", {}, m_result));
+  EXPECT_TRUE(m_result.As<Text>()->isError);
+  EXPECT_TRUE(m_session->IsLost());
+  m_session->Drain();
+  EXPECT_THAT(m_host.reports, HasSubstr("the browser is gone: the browser's pipe has ended"));
+  EXPECT_FALSE(m_session->CallByName("f", {}, m_result));
+  EXPECT_FALSE(m_session->Load(L"res:page.htm"));
+}
+
+TEST_F(PageSessionTest, APageThatHangsIsWaitedForOnceAndThenOnlyShortly) {
+  ASSERT_TRUE(BeginWith(L"good"));
+  EXPECT_FALSE(m_session->CallByName("pleaseHang", {}, m_result));
+  EXPECT_THAT(m_host.reports, HasSubstr("the page does not answer"));
+  const auto start = std::chrono::steady_clock::now();
+  EXPECT_FALSE(m_session->CallByName("pleaseHang", {}, m_result));
+  EXPECT_LT(std::chrono::steady_clock::now() - start, std::chrono::milliseconds(900));
+  EXPECT_TRUE(m_session->CallByName("f", {}, m_result));
+}
+
+TEST_F(PageSessionTest, TheBrowserEndsWithItsOwnerWithinAMoment) {
+  ASSERT_TRUE(BeginWith(L"good"));
+  const auto start = std::chrono::steady_clock::now();
+  m_session->End();
+  m_browser.End();
+  EXPECT_LT(std::chrono::steady_clock::now() - start, std::chrono::seconds(2));
+  EXPECT_EQ(ProfileCount(), 0u);
+  EXPECT_FALSE(m_session->CallByName("f", {}, m_result));
+}
+
+TEST(BrowserProcess, AProgramThatIsMissingCannotBeStarted) {
+  BrowserProcess browser;
+  std::wstring error;
+  EXPECT_FALSE(browser.Start(L"C:\\nowhere\\browser.exe", false, error));
+  EXPECT_THAT(ToUtf8(error), HasSubstr("cannot be started, error "));
+}
+
+}  // namespace
+}  // namespace engine
