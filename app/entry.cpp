@@ -1,5 +1,5 @@
-// The program's entry point. The exit code is always 0, unless the interactive mode finds no HTML engine; outcomes are told
-// in the log only.
+// The program's entry point. The exit code is always 0, unless the interactive mode finds no HTML engine; outcomes are
+// told in the log only.
 #include <windows.h>
 
 #include <shellapi.h>

@@ -5,6 +5,7 @@
 
 #include "core/files.h"
 #include "core/program_path.h"
+#include "interfaces/crash_handler_api.h"
 #include "stutil/logger_xml.h"
 #include "stutil/raised_logging.h"
 #include "tests/support/child_process.h"
@@ -118,18 +119,19 @@ TEST_F(ProductLoggingTest, RaisedLoggingIsPutBackHoweverTheProcessEnds) {
   const struct {
     const wchar_t* end;
     bool isLeftRaised;
-  } cases[] = {{L"end", false}, {L"crash", false}, {L"abort", false}, {L"wait", true}};
+    DWORD exitCode;
+  } cases[] = {{L"end", false, 0},
+               {L"crash", false, EXCEPTION_ACCESS_VIOLATION},  // the crash handler has had its turn
+               {L"abort", false, CRASH_CODE_ABORT},
+               {L"wait", true, 1}};
   for (const auto& one : cases) {
     SCOPED_TRACE(testing::PrintToString(std::wstring(one.end)));
     {
       ChildProcess child(L"\"" + ProgramFolder() + L"\\raised_logging_child.exe\" \"" + m_folder.Path() + L"\" " +
                          one.end);
       EXPECT_EQ(child.ReadLine(), "1");
-      if (one.isLeftRaised) {
-        child.Kill();
-      } else {
-        child.Wait();
-      }
+      if (one.isLeftRaised) child.Kill();
+      EXPECT_EQ(child.Wait(), one.exitCode);
     }
     EXPECT_EQ(PathExists(m_logging.MarkerPath()), one.isLeftRaised);
     EXPECT_TRUE(m_logging.Restore());  // as the next start does

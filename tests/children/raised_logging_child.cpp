@@ -10,9 +10,15 @@
 #include "stutil/product_logging.h"
 #include "stutil/product_logging_guard.h"
 
+// As the crash handler does: the system's own handling could start a debugger.
+static LONG WINAPI EndProcess(EXCEPTION_POINTERS* exception) {
+  TerminateProcess(GetCurrentProcess(), exception->ExceptionRecord->ExceptionCode);
+  return EXCEPTION_EXECUTE_HANDLER;
+}
+
 int wmain(int argc, wchar_t** argv) {
   if (argc != 3) return 2;
-  SetErrorMode(SEM_NOGPFAULTERRORBOX | SEM_FAILCRITICALERRORS);
+  SetUnhandledExceptionFilter(&EndProcess);
   InstallRuntimeFailureHooks();
   const stutil::ProductLogging logging(argv[1]);
   const stutil::ProductLoggingGuard guard([&logging] { logging.Restore(); });

@@ -14,6 +14,7 @@ bool IsFunction(const Node& node) {
 
 std::vector<qx::Value> Plain(FakeHtmlEngine& engine, const HtmlValue* values, uint32_t count) {
   std::vector<qx::Value> plain;
+  plain.reserve(count);
   for (uint32_t i = 0; i < count; ++i)
     plain.push_back(engine.Of(values[i]).ToValue());
   return plain;
@@ -251,6 +252,7 @@ FakeHtmlEngine::~FakeHtmlEngine() {
 
 qx::Value FakeHtmlEngine::CallNative(const std::string& name, const std::vector<Node>& arguments) {
   std::vector<HtmlValue> values;
+  values.reserve(arguments.size());
   for (const Node& argument : arguments)
     values.push_back(Make(argument));
   HtmlScriptCall call{name.c_str(), values.data(), static_cast<uint32_t>(values.size()), {}};
