@@ -96,7 +96,7 @@ TEST_F(PageSessionTest, ABrowserThatIsNoneIsGivenUpWithAReason) {
 
 TEST_F(PageSessionTest, NonsenseBetweenTheMessagesDoesNoHarm) {
   ASSERT_TRUE(BeginWith(L"good"));
-  EXPECT_EQ(ProfileCount(), 1u);
+  EXPECT_EQ(ProfileCount(), 2u);  // the folder and its mark
   ASSERT_TRUE(m_session->Load(L"res:page.htm"));
   EXPECT_THAT(m_host.reports, HasSubstr("the browser sends what is no message"));
   EXPECT_EQ(m_host.frames, "!!!");  // decoding is the window's part
@@ -141,6 +141,18 @@ TEST_F(PageSessionTest, TheBrowserEndsWithItsOwnerWithinAMoment) {
   EXPECT_LT(std::chrono::steady_clock::now() - start, std::chrono::seconds(2));
   EXPECT_EQ(ProfileCount(), 0u);
   EXPECT_FALSE(m_session->CallByName("f", {}, m_result));
+}
+
+TEST_F(PageSessionTest, WhatAKilledProcessLeftIsDeletedByTheNextOne) {
+  m_folder.MakeFile(L"tmp\\st-engine-old\\deep\\file");
+  ASSERT_TRUE(BeginWith(L"good"));
+  EXPECT_EQ(ProfileCount(), 2u);  // its own, and the mark of that
+  BrowserProcess other;
+  std::wstring error;
+  ASSERT_TRUE(other.Start(m_folder.Path(L"engine_peer_good.exe"), false, error));
+  EXPECT_EQ(ProfileCount(), 4u);
+  other.End();
+  EXPECT_EQ(ProfileCount(), 2u);
 }
 
 TEST(BrowserProcess, AProgramThatIsMissingCannotBeStarted) {
