@@ -40,11 +40,11 @@ std::wstring RegisteredPath(const std::wstring& name) {
 
 std::wstring FindBrowser() {
   for (const wchar_t* name : kRegistered) {
-    const std::wstring path = RegisteredPath(name);
+    std::wstring path = RegisteredPath(name);
     if (!path.empty() && IsFile(path)) return path;
   }
   for (const wchar_t* usual : kUsualPaths) {
-    const std::wstring path = ExpandEnvironment(usual);
+    std::wstring path = ExpandEnvironment(usual);
     if (path.find(L'%') == std::wstring::npos && IsFile(path)) return path;
   }
   return {};

@@ -19,6 +19,8 @@ constexpr ULONGLONG kConnectTimeout = 15000;  // milliseconds
 constexpr DWORD kPollInterval = 10;
 constexpr DWORD kEndTimeout = 3000;
 constexpr DWORD kLifeInterval = 4000;  // how often the watching shell is told that this process lives
+constexpr wchar_t kProfilePrefix[] = L"st-engine-";
+constexpr wchar_t kMarkSuffix[] = L".lock";
 constexpr DWORD kPipeSize = 1u << 20;
 
 struct AttributeListTraits {
@@ -31,7 +33,7 @@ using AttributeList = Scoped<AttributeListTraits>;
 std::wstring RandomName() {
   unsigned char bytes[16] = {};
   BCryptGenRandom(nullptr, bytes, sizeof bytes, BCRYPT_USE_SYSTEM_PREFERRED_RNG);
-  std::wstring name = L"st-engine-";
+  std::wstring name = kProfilePrefix;
   for (const unsigned char byte : bytes)
     name += Format(L"%02x", byte);
   return name;
@@ -48,6 +50,23 @@ bool Touch(const std::wstring& path) {
   return WriteWholeFile(path, "this process lives") == ERROR_SUCCESS;
 }
 
+// Deletes the profiles of processes that were killed: those without a mark.
+void DeleteOrphans(const std::wstring& parent) {
+  WIN32_FIND_DATAW data{};
+  const FindHandle find(FindFirstFileW(ExtendedPath(parent + kProfilePrefix + L"*").c_str(), &data));
+  if (!find) return;
+  do {
+    const std::wstring path = parent + data.cFileName;
+    const bool isFolder = (data.dwFileAttributes & FILE_ATTRIBUTE_DIRECTORY) != 0;
+    if (isFolder && !PathExists(path + kMarkSuffix)) DeleteFolder(path, true);
+  } while (FindNextFileW(find.Get(), &data));
+}
+
+KernelHandle MakeMark(const std::wstring& profile) {
+  return KernelHandle(CreateFileW(ExtendedPath(profile + kMarkSuffix).c_str(), GENERIC_WRITE | DELETE, 0, nullptr,
+                                  CREATE_NEW, FILE_FLAG_DELETE_ON_CLOSE, nullptr));
+}
+
 }  // namespace
 
 // The ends that the browser inherits.
@@ -62,6 +81,10 @@ bool BrowserProcess::MakeProfile(const std::wstring& program, std::wstring& erro
   // A Unix program needs a folder whose Unix path is known.
   const std::wstring parent = m_isUnix ? program.substr(0, 2) + L"\\tmp\\" : std::wstring(temporary);
   m_profile = parent + RandomName();
+  if (!m_isUnix) {
+    m_profileMark = MakeMark(m_profile);  // before the folder, so that nobody takes it for an orphan
+    DeleteOrphans(parent);
+  }
   if (const DWORD result = CreatePrivateFolder(m_profile); result != ERROR_SUCCESS) {
     error = Format(L"the browser's profile folder '%s' cannot be made, error %u", m_profile.c_str(), result);
     m_profile.clear();
@@ -195,6 +218,7 @@ void BrowserProcess::End() noexcept {
   for (const ULONGLONG start = GetTickCount64(); !DeleteFolder(m_profile, true); Sleep(kPollInterval)) {
     if (GetTickCount64() - start > kEndTimeout) break;
   }
+  m_profileMark.Reset();
   m_profile.clear();
 }
 

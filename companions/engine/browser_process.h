@@ -42,6 +42,7 @@ class BrowserProcess {
   std::wstring LastWords() const;
 
   std::wstring m_profile;
+  KernelHandle m_profileMark;  // "<profile>.lock", which the system deletes when this process ends
   bool m_isUnix = false;
   bool m_usesPort = false;
   bool m_runsWithoutSandbox = false;

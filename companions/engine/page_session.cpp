@@ -1,6 +1,7 @@
 #include "companions/engine/page_session.h"
 
 #include <algorithm>
+#include <cmath>
 
 #include "companions/engine/base64.h"
 #include "companions/engine/console_message.h"
@@ -101,8 +102,8 @@ bool PageSession::Load(const std::wstring& address) {
 void PageSession::Resize(int width, int height, double scale) {
   if (m_client == nullptr || width <= 0 || height <= 0) return;
   Json::Value params(Json::objectValue);
-  params["width"] = static_cast<int>(width / scale + 0.5);
-  params["height"] = static_cast<int>(height / scale + 0.5);
+  params["width"] = static_cast<int>(std::lround(width / scale));
+  params["height"] = static_cast<int>(std::lround(height / scale));
   params["deviceScaleFactor"] = scale;
   params["mobile"] = false;
   m_client->Send("Emulation.setDeviceMetricsOverride", params);

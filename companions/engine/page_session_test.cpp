@@ -83,9 +83,12 @@ TEST_F(PageSessionTest, ABrowserThatIsNoneIsGivenUpWithAReason) {
   };
   for (const auto& one : cases) {
     m_host.reports.clear();
-    m_session = std::make_shared<PageSession>(
-        m_host, [] {}, kShort);
-    EXPECT_FALSE(BeginWith(one.manner));
+    // Only the silent one is to be waited for; the others show themselves sooner or later.
+    PageTimeouts timeouts = kShort;
+    if (one.manner != std::wstring(L"silent")) timeouts.command = std::chrono::seconds(30);
+    const auto wake = [] {};
+    m_session = std::make_shared<PageSession>(m_host, wake, timeouts);
+    EXPECT_FALSE(BeginWith(one.manner)) << one.reason;
     EXPECT_THAT(m_host.reports, HasSubstr(one.reason));
     EXPECT_FALSE(m_session->Load(L"res:page.htm"));
     m_session->End();
@@ -96,7 +99,7 @@ TEST_F(PageSessionTest, ABrowserThatIsNoneIsGivenUpWithAReason) {
 
 TEST_F(PageSessionTest, NonsenseBetweenTheMessagesDoesNoHarm) {
   ASSERT_TRUE(BeginWith(L"good"));
-  EXPECT_EQ(ProfileCount(), 1u);
+  EXPECT_EQ(ProfileCount(), 2u);  // the folder and its mark
   ASSERT_TRUE(m_session->Load(L"res:page.htm"));
   EXPECT_THAT(m_host.reports, HasSubstr("the browser sends what is no message"));
   EXPECT_EQ(m_host.frames, "!!!");  // decoding is the window's part
@@ -141,6 +144,18 @@ TEST_F(PageSessionTest, TheBrowserEndsWithItsOwnerWithinAMoment) {
   EXPECT_LT(std::chrono::steady_clock::now() - start, std::chrono::seconds(2));
   EXPECT_EQ(ProfileCount(), 0u);
   EXPECT_FALSE(m_session->CallByName("f", {}, m_result));
+}
+
+TEST_F(PageSessionTest, WhatAKilledProcessLeftIsDeletedByTheNextOne) {
+  m_folder.MakeFile(L"tmp\\st-engine-old\\deep\\file");
+  ASSERT_TRUE(BeginWith(L"good"));
+  EXPECT_EQ(ProfileCount(), 2u);  // its own, and the mark of that
+  BrowserProcess other;
+  std::wstring error;
+  ASSERT_TRUE(other.Start(m_folder.Path(L"engine_peer_good.exe"), false, error));
+  EXPECT_EQ(ProfileCount(), 4u);
+  other.End();
+  EXPECT_EQ(ProfileCount(), 2u);
 }
 
 TEST(BrowserProcess, AProgramThatIsMissingCannotBeStarted) {

@@ -55,7 +55,7 @@ std::shared_ptr<View> View::Find(HWND window) {
 }
 
 std::shared_ptr<View> View::Create(HWND window) {
-  const auto view = std::make_shared<View>(window);
+  auto view = std::make_shared<View>(window);
   Views& all = AllViews();
   {
     const std::lock_guard guard(all.lock);
