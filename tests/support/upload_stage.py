@@ -11,6 +11,7 @@ sys.path.insert(0, str(pathlib.Path(__file__).resolve().parents[1] / "e2e"))
 
 from support_tool import BIN, ENVIRONMENT, LAUNCHER, LOGGER_XML, windows_path  # noqa: E402
 
+TIMEOUT = 60  # seconds for one upload
 SECRET = "k-8f3a51c0"  # the API key of every upload; it must never be in a log
 
 
@@ -53,8 +54,12 @@ class UploadStage:
                                 stderr=subprocess.DEVNULL, text=True)
 
     def finish(self, process):
-        """An upload that never ends is found by the time limit of the whole test."""
-        output, _ = process.communicate()
+        try:
+            output, _ = process.communicate(timeout=TIMEOUT)
+        except subprocess.TimeoutExpired:
+            process.kill()
+            process.communicate()
+            raise AssertionError(f"the upload does not end; log:\n{self._take_log()}") from None
         upload = Upload(output, self._take_log())
         if SECRET in upload.log:
             raise AssertionError(f"the key is in the log:\n{upload.log}")
