@@ -227,7 +227,7 @@ bool TisWnd::WriteReport(const std::wstring& folder, const qx::Value& report) {
   constexpr wchar_t kScope[] = L"TisWnd::WriteReport";
   {
     const std::lock_guard lock(m_dataMutex);
-    m_outputFolder = folder.substr(0, folder.find_last_not_of(L"\\/") + 1);
+    m_outputFolder = ShownPath(ExtendedPath(WithoutEndSeparators(folder)));  // for the user, who knows no current one
   }
   LOG_TRACE(kScope, L"-> json data");
   const DWORD error = WriteWholeFile(JoinPath(folder, L"guiData.json"), report.ToJsonText());

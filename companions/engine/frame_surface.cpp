@@ -1,6 +1,6 @@
 #include "companions/engine/frame_surface.h"
 
-#include <algorithm>
+#include <utility>
 
 namespace engine {
 namespace {
@@ -69,14 +69,27 @@ HRESULT FrameSurface::Decode(std::string& png) {
   return converter->CopyPixels(nullptr, width * 4, width * 4 * height, static_cast<BYTE*>(m_bits));
 }
 
-bool FrameSurface::ShowLayered(HWND window, SIZE size) const {
+bool FrameSurface::ShowLayered(HWND window, SIZE size) {
+  // The window takes the picture's size. While it changes its own, the browser may send the picture before once more,
+  // scaled to fit.
+  const bool isOfSize = size.cx == m_size.cx && size.cy == m_size.cy;
+  if (!isOfSize && !Stretch(size)) return false;
   const MemoryDc dc(CreateCompatibleDC(nullptr));
   const Selected selected(dc.Get(), m_bitmap.Get());
-  // While the window changes its size, the picture is still of the size before.
-  SIZE shown{std::min(size.cx, m_size.cx), std::min(size.cy, m_size.cy)};
   POINT origin{};
   BLENDFUNCTION blend{AC_SRC_OVER, 0, 255, AC_SRC_ALPHA};
-  return UpdateLayeredWindow(window, nullptr, nullptr, &shown, dc.Get(), &origin, 0, &blend, ULW_ALPHA) != FALSE;
+  return UpdateLayeredWindow(window, nullptr, nullptr, &size, dc.Get(), &origin, 0, &blend, ULW_ALPHA) != FALSE;
+}
+
+bool FrameSurface::Stretch(SIZE size) {
+  const ScopedBitmap former = std::move(m_bitmap);
+  const SIZE formerSize = m_size;
+  if (!Reserve(size)) return false;
+  const MemoryDc from(CreateCompatibleDC(nullptr));
+  const MemoryDc to(CreateCompatibleDC(nullptr));
+  const Selected source(from.Get(), former.Get());
+  const Selected target(to.Get(), m_bitmap.Get());
+  return StretchBlt(to.Get(), 0, 0, size.cx, size.cy, from.Get(), 0, 0, formerSize.cx, formerSize.cy, SRCCOPY) != FALSE;
 }
 
 void FrameSurface::Paint(HDC target) const {

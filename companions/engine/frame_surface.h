@@ -35,11 +35,12 @@ class FrameSurface {
   SIZE Size() const { return m_size; }
 
   // Shows the picture as the content of a layered window of this size. False with the last error.
-  bool ShowLayered(HWND window, SIZE size) const;
+  bool ShowLayered(HWND window, SIZE size);
   void Paint(HDC dc) const;
 
  private:
   bool Reserve(SIZE size);
+  bool Stretch(SIZE size);  // the picture is of this size then
 
   ComPtr<IWICImagingFactory> m_factory;
   ScopedBitmap m_bitmap;  // 32 bits, premultiplied, top down

@@ -175,7 +175,7 @@
     console.error('window.open: a page cannot open windows');
     return null;
   };
-  const within = (event, role) => event.target instanceof Element && event.target.closest(`[role="${role}"]`);
+  const within = (event, role) => event.target instanceof Element && event.target.closest(`[role~="${role}"]`);
   addEventListener('mousedown', (event) => {
     const isControl = event.target instanceof Element && event.target.closest('a, button, input, select, textarea');
     if (event.button === 0 && !isControl && within(event, 'window-caption')) notify({drag: true});

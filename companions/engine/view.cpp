@@ -15,8 +15,18 @@
 namespace engine {
 namespace {
 
-constexpr int kLargestLayout =
-    4096;  // pixels; a host may make its window larger than any screen before it knows better
+constexpr SIZE kLargestLayout = {4096, 4096};  // pixels
+
+// Before it is shown, a host may have made its window of any size: the page is laid out for the screen on which it will
+// be.
+SIZE LargestLayout(HWND window) {
+  MONITORINFO monitor{};
+  monitor.cbSize = sizeof monitor;
+  if (IsWindowVisible(window) || !GetMonitorInfoW(MonitorFromWindow(window, MONITOR_DEFAULTTOPRIMARY), &monitor)) {
+    return kLargestLayout;
+  }
+  return {monitor.rcWork.right - monitor.rcWork.left, monitor.rcWork.bottom - monitor.rcWork.top};
+}
 
 struct Views {
   SharedLock lock;
@@ -291,7 +301,8 @@ double View::Scale() const {
 void View::OnSize() {
   if (m_session == nullptr || m_isDestroyed) return;
   const SIZE size = ClientSize();
-  m_session->Resize(std::min<int>(size.cx, kLargestLayout), std::min<int>(size.cy, kLargestLayout), Scale());
+  const SIZE largest = LargestLayout(m_window);
+  m_session->Resize(std::min(size.cx, largest.cx), std::min(size.cy, largest.cy), Scale());
   // Frames cost time and are of no use before the window can be seen.
   if (!m_hasFrames && IsWindowVisible(m_window)) {
     m_hasFrames = true;

@@ -56,6 +56,12 @@
     return isGood;
   }
 
+  // Who mends a field need not look at its error any longer; whether it is good is asked again with the whole form.
+  function forgive(event) {
+    var field = event.target.closest("[aria-invalid]");
+    if (field) mark(field, field.getAttribute("aria-describedby").split(" ").pop(), true);
+  }
+
   // The first of these [field, is good] that is not good gets the focus.
   function focusFirstBad(checks) {
     for (var i = 0; i < checks.length; i++) {
@@ -214,6 +220,7 @@
     for (var i = 0; i < elements.length; i++) elements[i].addEventListener("click", handler);
   }
 
+  document.addEventListener("input", forgive);
   byId("details-form").addEventListener("submit", submitDetails);
   byId("issue-form").addEventListener("submit", submitIssue);
   onAll("#reproduce-toggle", toggleRecording);

@@ -65,6 +65,7 @@ class Stage:
         self._scratch = tempfile.TemporaryDirectory(prefix="st_e2e_")
         self.folder = pathlib.Path(self._scratch.name) / name
         self.folder.mkdir()
+        self._libraries = libraries
         self.logs = self.folder / "logs"
         self.outbox = self.folder / "outbox"
         for file in ("support_tool.exe", *libraries):
@@ -126,7 +127,7 @@ class Stage:
 
     def left(self):
         """The names of what runs left behind in the folder."""
-        own = {"support_tool.exe", *LIBRARIES, "Logger.xml", "qxlink.json", "privateKey.pem", "stsettings.json", "logs",
+        own = {"support_tool.exe", *self._libraries, "Logger.xml", "qxlink.json", "privateKey.pem", "stsettings.json", "logs",
                "outbox"}
         return sorted(p.name for p in self.folder.iterdir() if p.name not in own)
 

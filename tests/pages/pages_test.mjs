@@ -132,6 +132,8 @@ test('errors stand at their fields, the first of them gets the focus', async () 
   }
   assert.deepEqual(await violations(page), []);
   await page.fill('#name', 'Ana');
+  assert.equal(await page.isVisible('#name-error'), false); // mended
+  assert.equal(await page.getAttribute('#name', 'aria-invalid'), null);
   await page.fill('#email', 'Ana@example.com');
   await page.click('#details button[type=submit]');
   assert.equal(await focused(page), 'email');
@@ -148,6 +150,8 @@ test('errors stand at their fields, the first of them gets the focus', async () 
   assert.equal(await page.isVisible('#issue-error'), true);
   assert.equal(await page.isVisible('#description-error'), true);
   assert.deepEqual(await violations(page), []);
+  await page.check('input[value=other]');
+  assert.equal(await page.isVisible('#issue-error'), false);
   await page.close();
 });
 

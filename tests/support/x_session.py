@@ -5,32 +5,56 @@ import os
 import pathlib
 import shutil
 import subprocess
+import tempfile
 
 SOURCE = pathlib.Path(__file__).resolve().parents[2]
 WINE_ROOT = pathlib.Path(os.environ.get("ST_WINE_SCREEN_ROOT", SOURCE / "build/wine-screen"))
 
 
 class XSession:
-    """`environment` is what programs of the session are started with."""
+    """`environment` is what programs of the session are started with; `frame_buffer` is a file for screen.Screen, or
+    None on a display that is there already and was handed in. Without a window manager nothing can be minimised."""
+
+    def __init__(self, display=None, has_manager=False):
+        self.display = display
+        self._has_manager = has_manager
+        self._manager = None
+        self.frame_buffer = None
+        self._server = None
 
     def __enter__(self):
+        if self.display is None:
+            self._start_server()
+        self.environment = self._bash("true")
+        if self._has_manager:
+            self._manager = subprocess.Popen(["openbox"], env=self.environment, stdin=subprocess.DEVNULL,
+                                             stdout=subprocess.DEVNULL, stderr=subprocess.DEVNULL)
+        self._bash("st_wine_down; st_wine_up")
+        return self
+
+    def _start_server(self):
+        self._folder = tempfile.TemporaryDirectory(prefix="st_screen_")
+        self.frame_buffer = pathlib.Path(self._folder.name) / "Xvfb_screen0"
         reader, writer = os.pipe()
         self._server = subprocess.Popen(
-            ["Xvfb", "-displayfd", str(writer), "-screen", "0", "1280x1024x24", "-nolisten", "tcp"],
+            ["Xvfb", "-displayfd", str(writer), "-screen", "0", "1280x1024x24", "-nolisten", "tcp", "-noreset", "-fbdir",
+             self._folder.name],
             pass_fds=[writer], stdin=subprocess.DEVNULL, stdout=subprocess.DEVNULL, stderr=subprocess.DEVNULL)
         os.close(writer)
         with os.fdopen(reader) as answer:
             self.display = ":" + answer.readline().strip()
         if self.display == ":":
             raise RuntimeError("Xvfb did not start")
-        self.environment = self._bash("true")
-        self._bash("st_wine_down; st_wine_up")
-        return self
+        subprocess.run(["setxkbmap", "-display", self.display, "ro"], check=True)  # letters outside ASCII can be typed
 
     def __exit__(self, *_):
         self._bash("st_wine_down")
-        self._server.terminate()
-        self._server.wait()
+        for process in (self._manager, self._server):
+            if process is not None:
+                process.terminate()
+                process.wait()
+        if self._server is not None:
+            self._folder.cleanup()
 
     def _bash(self, command):
         script = (f'source "{SOURCE}/tools/wine_session.sh"; export DISPLAY={self.display}; {command} >/dev/null 2>&1; '

@@ -1,0 +1,213 @@
+"""The interactive mode from its start to its end, on a virtual screen, with mouse and keyboard: the real program with its
+pages, its engine and a browser, and a server that receives what is sent. Pictures of every step are left in the build
+folder, in screenshots/gui.
+"""
+import json
+import os
+import pathlib
+import shutil
+import socket
+import sys
+import tempfile
+import time
+import unittest
+
+sys.path.insert(0, str(pathlib.Path(__file__).resolve().parents[1] / "support"))
+from fault_proxy import FaultProxy, Faults  # noqa: E402
+from ingest import IngestServer  # noqa: E402
+from open_package import open_package  # noqa: E402
+from report_walk import ANSWERS, ReportWalk, choose_language  # noqa: E402
+from support_tool import BIN, PRIVATE_KEY, Stage, read_archive, windows_path  # noqa: E402
+from window_driver import Window, browser_processes, wait_for  # noqa: E402
+from x_session import XSession  # noqa: E402
+
+PICTURES = pathlib.Path(os.environ.get("ST_PICTURES", BIN.parent.parent / "screenshots/gui"))
+LIBRARIES = ("log.dll", "qxlink.dll", "framework.dll", "sciter.dll", "ServConfig.dll", "ServConfig.json",
+             "LanguageManager.dll")
+PRODUCT_LOGGER_XML = """<?xml version="1.0" encoding="utf-8"?>
+<!-- of the product -->
+<configuration path="{folder}">
+  <level>FATAL | CRITICAL | ERROR</level>
+  <depth>EXE</depth>
+  <maxSize>0</maxSize>
+</configuration>
+"""
+ENGLISH, ROMANIAN = ANSWERS["en"], ANSWERS["ro"]
+
+
+class InteractiveStage(Stage):
+    def __init__(self):
+        super().__init__("a stage 100% ș", LIBRARIES)
+        for folder in ("gui", "language"):
+            shutil.copytree(BIN / folder, self.path(folder))
+        self.logger_xml = self.path("Logger.xml")
+        self.logger_xml.write_text(PRODUCT_LOGGER_XML.format(folder=windows_path(self.logs)), encoding="utf-8")
+        self.former = self.logger_xml.read_bytes()
+
+    def send_to(self, port, **members):
+        document = {"endpoint": f"http://localhost:{port}/files", "allow_plain_http": True, "proxy": "none", "retries": 1,
+                    "retry_delay": 0.05, "outbox": windows_path(self.outbox), **members}
+        self.path("qxlink.json").write_text(json.dumps(document), encoding="utf-8")
+
+    def logging_is_raised(self):
+        text = self.logger_xml.read_text(encoding="utf-8")
+        return "<depth>MODULE</depth>" in text and "TRACE" in text
+
+    def logging_is_as_before(self):
+        return self.logger_xml.read_bytes() == self.former and not self.path("Logger.xml.raised").exists()
+
+
+class WindowTest(unittest.TestCase):
+    @classmethod
+    def setUpClass(cls):
+        cls.session = XSession(has_manager=True)
+        cls.session.__enter__()
+        cls.addClassCleanup(cls.session.__exit__)
+
+    def setUp(self):
+        self.stage = InteractiveStage()
+        self.addCleanup(self.stage.close)
+        scratch = tempfile.TemporaryDirectory(prefix="st_ingest_")
+        self.addCleanup(scratch.cleanup)
+        self.received = pathlib.Path(scratch.name)
+
+    def open(self, *arguments):
+        command = [windows_path(self.stage.path("support_tool.exe")), *arguments]
+        return self.enterContext(Window(self.session, command, self.stage.folder))
+
+    def server(self):
+        return self.enterContext(IngestServer(self.received))
+
+    def assertEnded(self, window):
+        self.assertEqual(window.wait_for_end(), 0)
+        self.assertTrue(self.stage.logging_is_as_before())
+
+    def assertReceived(self, server, answers, recorded):
+        """The one package that the server has holds the manifest and exactly these answers; returns the times."""
+        self.assertEqual(len(server.receipts()), 1)
+        self.assertEqual(len(server.stored()), 1)
+        archive = self.received / "opened.zip"
+        archive.write_bytes(open_package(server.content(server.stored()[0]), PRIVATE_KEY))
+        entries = {name.rsplit("/", 1)[-1]: data for name, data in read_archive(archive).items()}
+        manifest = json.loads(entries["collection_manifest.json"])
+        self.assertEqual([(row["name"], row["outcome"]) for row in manifest["collectors"] if row["outcome"] == "data"],
+                         [("system_summary", "data")])
+        data = json.loads(entries["guiData.json"])
+        times = {name: data["issue"].pop(name) for name in ("reproduce_start_time", "reproduce_stop_time") if recorded}
+        self.assertEqual(data, answers.gui_data(recorded))
+        return times
+
+    def test_a_report_in_english_arrives_with_exactly_the_answers(self):
+        server = self.server()
+        line = self.enterContext(FaultProxy(server.port))
+        self.stage.send_to(line.port)
+        begin = time.time()
+        window = self.open()
+        line.upstream = Faults(stall_after=2000, stall_seconds=1)  # so that the progress can be seen
+        walk = ReportWalk(window, ENGLISH, PICTURES / "en")
+        walk.whole(while_recording=lambda: self.assertTrue(self.stage.logging_is_raised()))
+        self.assertTrue(self.stage.logging_is_as_before())
+        walk.picture("progress")
+        walk.finish()
+        window.click("#success button")
+        self.assertEnded(window)
+        times = self.assertReceived(server, ENGLISH, True)
+        self.assertTrue(begin - 1 <= times["reproduce_start_time"] <= times["reproduce_stop_time"] <= time.time())
+        self.assertEqual(self.stage.left(), ["gui", "language"])
+
+
+    def test_a_report_in_romanian_arrives_although_the_server_was_down_at_first(self):
+        with socket.create_server(("127.0.0.1", 0)) as taken:
+            port = taken.getsockname()[1]
+        self.stage.send_to(port)
+        choose_language(self.stage.folder, "ro")
+        window = self.open("noda")
+        walk = ReportWalk(window, ROMANIAN, PICTURES / "ro")
+        walk.whole()
+        walk.finish("failure")
+        self.assertIn("internet", window.text("#failure-help"))
+        self.assertEqual(window.text("#failure-path"), windows_path(self.stage.path("collected.zip")))
+        self.assertTrue(self.stage.path("collected.zip").exists())
+        server = self.server()
+        line = self.enterContext(FaultProxy(server.port, port))
+        line.upstream = Faults(stall_after=2000, stall_seconds=1)
+        window.click("#retry")
+        window.wait_for_section("progress")
+        walk.picture("progress")
+        walk.finish()
+        window.click("#close")
+        self.assertEnded(window)
+        self.assertReceived(server, ROMANIAN, True)
+
+    def test_keyboard_alone_leads_to_the_end(self):
+        server = self.server()
+        self.stage.send_to(server.port)
+        window = self.open()
+        for field, text in (("name", ENGLISH.name), ("email", ENGLISH.email)):
+            window.tab_to(field)
+            window.fill_focused(text)
+        window.tab_to("consent")
+        window.key("space", "Return")
+        window.wait_for_section("issue")
+        window.key("Tab", "space")  # the first kind: "slow"
+        window.tab_to("description")
+        window.fill_focused(ENGLISH.description)
+        window.key("Tab", "Tab", "Return")
+        window.wait_for_section("reproduce")
+        window.tab_to("reproduce-next")
+        window.key("Return")
+        window.wait_for_section("send")
+        window.tab_to("send-button")
+        window.key("Return")
+        window.wait_for_section("success")
+        window.key("Tab", "Return")
+        self.assertEnded(window)
+        self.assertReceived(server, ENGLISH, False)
+
+    def test_closing_while_recording_restores_the_logging(self):
+        window = self.open()
+        walk = ReportWalk(window, ENGLISH)
+        walk.to_the_recording()
+        walk.start_recording()
+        self.assertTrue(self.stage.logging_is_raised())
+        window.key("alt+F4")
+        self.assertEnded(window)
+
+    def test_closing_while_sending_sends_to_the_end(self):
+        server = self.server()
+        line = self.enterContext(FaultProxy(server.port))
+        self.stage.send_to(line.port)
+        window = self.open()
+        walk = ReportWalk(window, ENGLISH)
+        walk.to_the_review()
+        line.upstream = Faults(stall_after=2000, stall_seconds=3)
+        walk.send()
+        wait_for("the first bytes", lambda: line.forwarded("upstream") >= 2000)
+        window.click("#close")
+        wait_for("the window's end", lambda: not window.is_visible())
+        self.assertIsNone(window.process.poll())
+        self.assertEnded(window)
+        self.assertReceived(server, ENGLISH, False)
+
+    def test_the_caption_moves_the_window_and_its_buttons_minimise_and_close_it(self):
+        window = self.open()
+        x, y, width, height = window.place()
+        self.assertEqual((x, y), (1280 // 2 - width // 2, 1024 // 2 - height // 2))
+        self.assertEqual((width, height), (window.read("innerWidth"), window.read("innerHeight")))
+        window.drag("#product", -150, 60)
+        # It goes along from where the mouse is when the page has told of the press.
+        wait_for("the move", lambda: window.place()[0] <= x - 75 and window.place()[1] >= y + 30)
+        self.assertEqual(window.place()[2:], (width, height))
+        corner = (window.place()[0] + 5, window.place()[1] + 5)
+        colour = window.screen.colour(*corner)
+        window.click("#minimize")
+        wait_for("minimising", lambda: not window.is_visible() and window.screen.colour(*corner) != colour)
+        window.activate()
+        wait_for("the window", lambda: window.is_visible() and window.screen.colour(*corner) == colour)
+        window.fill("#name", "Ana")
+        window.click("#close")
+        self.assertEnded(window)
+
+
+if __name__ == "__main__":
+    unittest.main(verbosity=2)
