@@ -262,8 +262,11 @@ test('the button turns light into dark, tables and timeline too', async () => {
 });
 
 test('what is printed are plain tables of 200 rows at most, and the rest is said', async () => {
-  const page = await open('small', {colorScheme: 'dark'});
+  const page = await open('small', {hash: '#events', colorScheme: 'dark'});
+  await page.waitForSelector(`${view} .ag-row`);
   await page.evaluate(() => dispatchEvent(new Event('beforeprint')));
+  assert.ok(await page.locator('.overview .chart canvas').first().isVisible());
+  assert.equal(await page.$$eval('.finding:not([open])', (closed) => closed.length), 0);
   assert.match(await page.textContent('#print-view'), /The first 200 of 3,000 rows are printed/);
   assert.equal(await page.$$eval('#print-view table', (tables) => tables.length), 6);
   assert.equal(await page.$$eval('#print-view tbody tr', (rows) => rows.length), 60 + 200 + 6 + 160 + 7 + 200);
@@ -271,6 +274,7 @@ test('what is printed are plain tables of 200 rows at most, and the rest is said
   assert.equal(await page.evaluate(() => getComputedStyle(document.querySelector('#print-view td')).color), 'rgb(28, 33, 41)');
   await page.evaluate(() => dispatchEvent(new Event('afterprint')));
   assert.equal(await page.$$eval('#print-view *', (nodes) => nodes.length), 0);
+  assert.equal(await page.$$eval(`${view} .above .chart`, (charts) => charts.length), 1);
   await page.pdf({path: `${output}/small.pdf`, format: 'A4', printBackground: true});
   assert.ok(readFileSync(`${output}/small.pdf`).length > 50000);
   await close(page);

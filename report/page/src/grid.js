@@ -14,8 +14,9 @@ ModuleRegistry.registerModules([
   CellStyleModule, ClientSideRowModelApiModule, ClientSideRowModelModule, ColumnApiModule, DateFilterModule, EventApiModule, ExternalFilterModule, LocaleModule,
   NumberFilterModule, RenderApiModule, RowApiModule, RowStyleModule, ScrollApiModule, TextFilterModule]);
 
+const kByDate = ['software', 'updates'];  // tables that open with what came last at the top
 const kSampleRows = 300;
-const [kLetter, kPadding, kNarrowest, kNarrowestTime, kWidest] = [7.1, 30, 84, 178, 420];  // pixels
+const [kLetter, kPadding, kNarrowest, kNarrowestTime, kWidest] = [7.1, 30, 96, 178, 420];  // pixels
 
 export class Grid {
   #table;
@@ -133,6 +134,7 @@ export class Grid {
       cellRendererSelector: ({value}) => (typeof value === 'string' && hasSpecial(value) ? {component: specialCell} : undefined),
       initialWidth: this.#width(column, index),
     };
+    if (kByDate.includes(this.#table.id) && this.#table.columns.findIndex(({type}) => type === 'time') === index) definition.initialSort = 'desc';
     if (column.id === 'severity') definition.cellClass = ({value}) => `severity ${severityOf(value)}`;
     if (column.id === 'kind') definition.cellClass = ({value}) => `kind-${/^[a-z]+$/.test(value) ? value : 'other'}`;
     if (tree && index === 0) {

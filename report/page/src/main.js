@@ -37,7 +37,13 @@ class Report {
     this.#search = new Search(report.tables, (table, matches, count) => this.#showMatches(table, matches, count));
     this.#startSearchField();
     startTheme(at('theme'), () => this.#timeline?.redraw());
-    startPrinting([...this.#views.values()], at('print-view'), () => this.#timeline?.redraw());
+    startPrinting([...this.#views.values()], at('print-view'), () => {
+      this.#overview.hidden = false;
+      this.#showTimeline('overview');
+    }, () => {
+      this.#overview.hidden = this.#current !== 'overview';
+      this.#showTimeline(this.#current);
+    });
     at('print').addEventListener('click', () => print());
     addEventListener('hashchange', () => this.#go());
     this.#go();
@@ -83,10 +89,16 @@ class Report {
       this.#navigation.setCurrent(name);
       at('main').scrollTop = 0;
     }
-    if (name === 'overview') this.#timeline?.showIn(this.#timelineHost);
-    else if (name === this.#report.timeline?.table.id) this.#timeline.showIn(this.#views.get(name).top);
+    this.#showTimeline(name);
     const view = this.#views.get(name);
     if (view && row !== null && row < view.table.rows.length) view.reveal(row);
+  }
+
+  // There is one timeline: it stands in the overview and above the events, wherever the reader is.
+  #showTimeline(name) {
+    if (name === 'overview') this.#timeline?.showIn(this.#timelineHost);
+    else if (name === this.#report.timeline?.table.id) this.#timeline.showIn(this.#views.get(name).top);
+    this.#timeline?.redraw();
   }
 
   #startSearchField() {

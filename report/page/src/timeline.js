@@ -36,7 +36,8 @@ export class Timeline {
       return;
     }
     this.#view = this.#whole();
-    this.element.append(this.#buttons(onSelect), this.#canvas, this.#legend);
+    this.element.append(this.#buttons(onSelect), this.#canvas, element('div', {class: 'below'}, this.#legend,
+      element('p', {class: 'hint quiet'}, 'A click shows the events of that time. Ctrl and wheel, or the slider, zoom.')));
     this.onSelect = onSelect;
   }
 
@@ -44,13 +45,12 @@ export class Timeline {
   showIn(host) {
     host.append(this.element);
     if (!this.#events) return;
-    if (this.#chart) this.#chart.resize();
-    else this.#start();
+    if (!this.#chart) this.#start();
   }
 
   // After the colours or the width have changed.
   redraw() {
-    if (!this.#chart) return;
+    if (!this.#chart || this.#canvas.offsetWidth === 0) return;
     this.#chart.resize();
     this.#draw();
   }
