@@ -44,7 +44,7 @@ function events(count, random) {
       `${pick(texts)} Item ${index}: {${Math.floor(random() * 1e9).toString(16)}} C:\\Program Files\\Guard\\module${index % 97}.dll`];
   }).sort((a, b) => a[0] - b[0]);
   return {id: 'events', title: 'Event log',
-    columns: columns(['time', 'Time', 'time'], ['severity', 'Severity'], ['log', 'Log'], ['source', 'Source'], ['event', 'Event', 'number'], ['text', 'Text']), rows};
+    columns: columns(['time', 'Time', 'time'], ['type', 'Type'], ['log', 'Log'], ['source', 'Source'], ['event', 'Event', 'number'], ['text', 'Text']), rows};
 }
 
 function processes(count) {
@@ -122,7 +122,7 @@ export function sample({eventCount = 3000, hostile = false, compared = false} = 
     findings: hostile ? [{...findings[0], title: odd, explanation: odd, evidence: kHostile.map((text, row) => ({file: text, path: text, text, table: 'hostile', row}))}] : findings,
     gauges: [{name: 'Memory', used: 11.2 * 2 ** 30, total: 16 * 2 ** 30, kind: 'memory'}, {name: 'C:', used: 59.1 * 2 ** 30, total: 60 * 2 ** 30, kind: 'disk'},
       {name: 'D:', used: 380 * 2 ** 30, total: 931 * 2 ** 30, kind: 'disk'}],
-    timeline: {table: 'events', time: 'time', severity: 'severity', from: kStart + 4 * 24 * kHour + 0.5 * kHour, to: kStart + 4 * 24 * kHour + 1.5 * kHour},
+    timeline: {table: 'events', time: 'time', severity: 'type', from: kStart + 4 * 24 * kHour + 0.5 * kHour, to: kStart + 4 * 24 * kHour + 1.5 * kHour},
     tables: [...(compared ? [changes()] : []), ...tables, ...(hostile ? [hostileTable()] : [])],
     comparison: compared ? {with: {name: 'collected_2026-01-10.zip', bytes: 7000000, collectedAt: '2026-01-10T09:00:00Z'}, changes: 4} : null,
   };

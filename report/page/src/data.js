@@ -27,7 +27,7 @@ function completeTable(table) {
   const columns = list(table.columns);
   const rows = list(table.rows).map(list);
   const parent = columns.findIndex((column) => column.id === table.parent);
-  return {...table, columns, rows, tree: table.parent != null && parent >= 0 ? layOut(rows.map((cells) => cells[parent])) : null, parent};
+  return {...table, id: String(table.id), columns, rows, tree: table.parent != null && parent >= 0 ? layOut(rows.map((cells) => cells[parent])) : null, parent};
 }
 
 // With the table and the columns' indexes in the place of their ids; null when one of them is not there.

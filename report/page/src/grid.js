@@ -20,6 +20,7 @@ const [kLetter, kPadding, kNarrowest, kNarrowestTime, kWidest] = [7.1, 30, 96, 1
 
 export class Grid {
   #table;
+  #severity;
   #api;
   #matches = null;       // of the search, a byte for each row, or null: all
   #interval = null;      // {column, from, to}: rows with a time in it only
@@ -28,9 +29,11 @@ export class Grid {
   #marked = -1;
 
   // `onRow(index)` is called when a row gets the focus or a click, `onShown(count)` when the rows that are shown have changed.
-  constructor(table, host, {cited, onRow, onShown}) {
+  // severity: the index of the column that holds one, or -1.
+  constructor(table, host, {cited, severity, onRow, onShown}) {
     adoptGridStyles();
     this.#table = table;
+    this.#severity = severity;
     const order = table.tree?.order ?? table.rows.keys();
     this.#api = createGrid(host, {
       ...themeOptions,
@@ -50,7 +53,7 @@ export class Grid {
         cited: ({data}) => cited.has(data.index),
         marked: ({data}) => data.index === this.#marked,
       },
-      localeText: {noRowsToShow: 'No row matches', noMatchingRows: 'No row matches'},
+      localeText: {noRowsToShow: 'The package holds none', noMatchingRows: 'No row matches'},
       onModelUpdated: () => onShown(this.shown),
       onCellFocused: ({rowIndex}) => {
         const node = rowIndex == null ? null : this.#api.getDisplayedRowAtIndex(rowIndex);
@@ -135,14 +138,16 @@ export class Grid {
       initialWidth: this.#width(column, index),
     };
     if (kByDate.includes(this.#table.id) && this.#table.columns.findIndex(({type}) => type === 'time') === index) definition.initialSort = 'desc';
-    if (column.id === 'severity') definition.cellClass = ({value}) => `severity ${severityOf(value)}`;
+    if (index === this.#severity) definition.cellClass = ({value}) => `severity ${severityOf(value)}`;
+    if (column.id === 'signed') definition.cellClass = ({value}) => (value === false ? 'severity warning' : undefined);
     if (column.id === 'kind') definition.cellClass = ({value}) => `kind-${/^[a-z]+$/.test(value) ? value : 'other'}`;
     if (tree && index === 0) {
       definition.cellRendererSelector = undefined;
       definition.cellRenderer = (params) => this.#treeCell(params);
       definition.suppressKeyboardEvent = (params) => this.#treeKey(params);
     }
-    if (index === this.#table.columns.length - 1) Object.assign(definition, {flex: 1, minWidth: definition.initialWidth});
+    const last = this.#table.columns.length - (tree && parent === this.#table.columns.length - 1 ? 2 : 1);
+    if (index === last) Object.assign(definition, {flex: 1, minWidth: definition.initialWidth});
     return definition;
   }
 
@@ -151,7 +156,7 @@ export class Grid {
     const lengths = this.#table.rows.slice(0, kSampleRows).map((cells) => formatCell(cells[index], column.type).length).sort((a, b) => a - b);
     const usual = lengths[Math.floor(lengths.length * 0.9)] ?? 0;
     const depth = this.#table.tree && index === 0 ? 90 : 0;
-    const dot = column.id === 'severity' ? 16 : 0;
+    const dot = index === this.#severity ? 16 : 0;
     const width = Math.max(usual, (column.title ?? column.id).length + 3) * kLetter + kPadding + depth + dot;
     return Math.round(Math.min(Math.max(width, column.type === 'time' ? kNarrowestTime : kNarrowest), kWidest));
   }

@@ -59,7 +59,8 @@ class Report {
     }
     const host = element('section', {class: 'view table', 'aria-label': visible(table.title ?? table.id), hidden: true});
     at('main').append(host);
-    this.#views.set(table.id, new TableView(table, host, {findings, onClearSearch: () => this.#setQuery('')}));
+    const severity = this.#report.timeline?.table === table ? this.#report.timeline.severity : -1;
+    this.#views.set(table.id, new TableView(table, host, {findings, severity, onClearSearch: () => this.#setQuery('')}));
     this.#navigation.setCount(table.id, table.rows.length);
   }
 
@@ -72,8 +73,11 @@ class Report {
         location.hash = encodeURIComponent(timeline.table.id);
       });
     }
-    const hasRow = ({table, row}) => this.#views.has(table) && Number.isInteger(row) && row >= 0 && row < this.#views.get(table).table.rows.length;
-    showOverview(this.#report, this.#overview, {timelineHost: this.#timelineHost, hasRow});
+    const linkOf = ({table, row}) => {
+      if (!this.#views.has(table)) return null;
+      return `#${encodeURIComponent(table)}${row >= 0 && row < this.#views.get(table).table.rows.length ? `/${row}` : ''}`;
+    };
+    showOverview(this.#report, this.#overview, {timelineHost: this.#timelineHost, linkOf});
     this.#navigation.setCount('overview', null);
   }
 

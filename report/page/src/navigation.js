@@ -7,14 +7,15 @@ export class Navigation {
 
   constructor(host, tables) {
     const list = element('ul', {});
-    const add = (id, title) => {
+    const add = (id, title, apart = false) => {
       const count = element('span', {class: 'count'});
       const link = element('a', {href: `#${encodeURIComponent(id)}`}, foreign(title), count);
-      list.append(element('li', {}, link));
+      list.append(element('li', {class: apart ? 'apart' : null}, link));
       this.#links.set(id, {link, count});
     };
     add('overview', 'Overview');
-    for (const table of tables) add(table.id, table.title ?? table.id);
+    const isOther = ({id}) => id.startsWith('doc-');  // documents that have no table of their own
+    tables.forEach((table, index) => add(table.id, table.title ?? table.id, isOther(table) && !(index > 0 && isOther(tables[index - 1]))));
     host.append(list);
   }
 

@@ -10,13 +10,13 @@ const kSeverityNames = {error: 'Error', warning: 'Warning', info: 'Information'}
 // The parts that the search hides when they do not match, each with its text.
 let searched = [];
 
-// `timelineHost` is put in its place; hasRow(evidence) says whether evidence can link to a row of a table.
-export function showOverview(report, host, {timelineHost, hasRow}) {
+// `timelineHost` is put in its place; linkOf(evidence) is the address of its row, or else its table, or null.
+export function showOverview(report, host, {timelineHost, linkOf}) {
   searched = [];
   host.append(...[
     report.comparison && comparison(report.comparison, report.tables), machine(report),
     element('div', {class: 'columns'}, words(report.user), missing(report.missing)),
-    findings(report.findings, hasRow), timelineHost, gauges(report.gauges)].filter(Boolean));
+    findings(report.findings, linkOf), timelineHost, gauges(report.gauges)].filter(Boolean));
 }
 
 // Hides what does not hold all the words; the number of parts that do.
@@ -81,31 +81,32 @@ function missing(list) {
     element('p', {class: 'quiet'}, 'Nothing: all that was to be collected is in the package.'));
 }
 
-function findings(list, hasRow) {
+function findings(list, linkOf) {
   const count = (severity) => list.filter((finding) => finding.severity === severity).length;
   const summary = Object.entries(kSeverityNames).filter(([severity]) => count(severity) > 0)
     .map(([severity, name]) => element('span', {class: `badge ${severity}`}, `${name} ${count(severity)}`));
   return section('findings', 'Findings',
     list.length > 0 ? element('p', {class: 'summary'}, ...summary) : element('p', {class: 'quiet'}, 'No rule found anything.'),
-    ...list.map((finding) => showFinding(finding, hasRow)));
+    ...list.map((finding) => showFinding(finding, linkOf)));
 }
 
-function showFinding({id, severity, title, explanation, count, evidence}, hasRow) {
+function showFinding({id, severity, title, explanation, count, evidence}, linkOf) {
   const known = kSeverityNames[severity] ? severity : 'info';
   const more = count - evidence.length;
   const details = element('details', {class: `finding ${known}`, 'data-id': id, open: known !== 'info'},
     element('summary', {}, element('span', {class: `badge ${known}`}, kSeverityNames[known]), element('span', {class: 'name'}, foreign(title)),
       element('span', {class: 'quiet'}, plural(count ?? evidence.length, 'place'))),
     element('p', {}, foreign(explanation)),
-    element('ul', {class: 'evidence'}, ...evidence.map((one) => showEvidence(one, hasRow))),
+    element('ul', {class: 'evidence'}, ...evidence.map((one) => showEvidence(one, linkOf))),
     more > 0 ? element('p', {class: 'quiet'}, `and ${formatCount(more)} more`) : null);
   return searchable(details, title, explanation, ...evidence.flatMap(({file, path, text}) => [file, path, text]));
 }
 
-function showEvidence(evidence, hasRow) {
+function showEvidence(evidence, linkOf) {
   const text = foreign(evidence.text || evidence.path || evidence.file);
   const place = element('span', {class: 'place'}, foreign([evidence.file, evidence.path].filter(Boolean).join(' › ')));
-  return element('li', {}, hasRow(evidence) ? element('a', {href: `#${encodeURIComponent(evidence.table)}/${evidence.row}`}, text) : text, ' ', place);
+  const href = linkOf(evidence);
+  return element('li', {}, href ? element('a', {href}, text) : text, ' ', place);
 }
 
 function gauges(list) {

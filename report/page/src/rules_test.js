@@ -14,7 +14,7 @@ import {severityOf} from './severity.js';
 test('characters that hide, control or turn are shown as signs, all others as they are', () => {
   for (const [text, shown] of [
     ['a\u0000b', 'aU+0000b'], ['\u001b[31m', 'U+001B[31m'], ['\u0085', 'U+0085'], ['x\u202Egnp.exe', 'xU+202Egnp.exe'], ['\u2066\u2069', 'U+2066U+2069'],
-    ['\u200b\ufeff', 'U+200BU+FEFF'], ['\u{e0041}', 'U+E0041'], ['\ud800', 'U+D800'], ['one\ntwo\t', 'one↵two⇥'], ['\u2028', 'U+2028']]) {
+    ['\u200b\ufeff', 'U+200BU+FEFF'], ['\u{e0041}', 'U+E0041'], ['\ud800', 'U+D800'], ['one\ntwo\t', 'one↵two⇥'], ['a\r\nb\rc', 'a↵bU+000Dc'], ['\u2028', 'U+2028']]) {
     assert.equal(visible(text), shown);
     assert.equal(hasSpecial(text), true, shown);
   }

@@ -7,6 +7,7 @@ export class TableView {
   #table;
   #findings;        // row index -> titles of the findings that rest on it
   #host;
+  #severity;
   #onClearSearch;
   #grid = null;
   #matches = null;
@@ -16,10 +17,11 @@ export class TableView {
   #details = element('aside', {class: 'details', 'aria-label': 'Details of the row', tabindex: '0', hidden: true});
   #gridHost = element('div', {class: 'grid'});
 
-  constructor(table, host, {findings, onClearSearch}) {
+  constructor(table, host, {findings, severity, onClearSearch}) {
     this.#table = table;
     this.#host = host;
     this.#findings = findings;
+    this.#severity = severity;
     this.#onClearSearch = onClearSearch;
     this.top = element('div', {class: 'above'});
   }
@@ -33,7 +35,7 @@ export class TableView {
       element('div', {class: 'heading'}, element('h2', {}, foreign(this.#table.title ?? this.#table.id)), this.#count, this.#limits), this.top,
       element('div', {class: 'body'}, this.#gridHost, this.#details));
     this.#grid = new Grid(this.#table, this.#gridHost, {
-      cited: this.#findings, onRow: (index) => this.#showDetails(index), onShown: (shown) => this.#describe(shown)});
+      cited: this.#findings, severity: this.#severity, onRow: (index) => this.#showDetails(index), onShown: (shown) => this.#describe(shown)});
     if (this.#matches) this.#grid.setMatches(this.#matches);
     if (this.#interval) this.#grid.setInterval(this.#interval);
     this.#describe(this.#grid.shown);

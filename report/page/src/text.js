@@ -2,16 +2,19 @@
 // invisible, move the cursor or turn the direction of writing are replaced by a visible sign.
 
 const kSpecial =
-  /[\u0000-\u001f\u007f-\u009f\u00ad\u034f\u061c\u115f\u1160\u17b4\u17b5\u180b-\u180f\u200b-\u200f\u2028-\u202e\u2060-\u206f\u3164\ufeff\uffa0\ufff0-\ufffb\ud800-\udfff]|[\u{e0000}-\u{e0fff}]/gu;
+  /\r\n|[\u0000-\u001f\u007f-\u009f\u00ad\u034f\u061c\u115f\u1160\u17b4\u17b5\u180b-\u180f\u200b-\u200f\u2028-\u202e\u2060-\u206f\u3164\ufeff\uffa0\ufff0-\ufffb\ud800-\udfff]|[\u{e0000}-\u{e0fff}]/gu;
 
 export function hasSpecial(text) {
   kSpecial.lastIndex = 0;
   return kSpecial.test(text);
 }
 
-// Signs that every font has: an arrow for a line end and a tab, "U+202E" for the others.
+// Usual in a text, so that they need no attention.
+const kQuiet = new Set(['\n', '\r\n', '\t']);
+
+// Signs that most fonts have: an arrow for a line end and a tab, "U+202E" for the others.
 export function sign(character) {
-  if (character === '\n') return '↵';
+  if (character === '\n' || character === '\r\n') return '↵';
   if (character === '\t') return '⇥';
   return `U+${character.codePointAt(0).toString(16).toUpperCase().padStart(4, '0')}`;
 }
@@ -36,7 +39,7 @@ export function appendText(element, text, {lines = false} = {}) {
 
 function mark(character) {
   const span = document.createElement('span');
-  span.className = 'special';
+  span.className = kQuiet.has(character) ? 'special quiet' : 'special';
   span.textContent = sign(character);
   return span;
 }

@@ -116,7 +116,7 @@ export class Timeline {
       useUTC: true,
       textStyle: {fontFamily: font, color: colour.text},
             aria: {enabled: true, label: {description: 'Events over time by severity. The list below holds the counts.'}},
-      grid: {left: 46, right: 16, top: 22, bottom: 58},
+      grid: {left: 46, right: 44, top: 22, bottom: 58},
       tooltip: {trigger: 'axis', renderMode: 'richText', axisPointer: {type: 'shadow', snap: true}, formatter: (series) => this.#tip(series)},
       xAxis: {type: 'time', min: from, max: to, axisLabel: {color: colour.quiet, hideOverlap: true, formatter: kTimeLabels}, axisLine: {lineStyle: {color: colour.line}}, splitLine: {show: false}},
       yAxis: {type: 'value', minInterval: 1, axisLabel: {color: colour.quiet}, splitLine: {lineStyle: {color: colour.line}}},
