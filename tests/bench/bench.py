@@ -310,6 +310,23 @@ def upload(bench):
     shutil.rmtree(stage)
 
 
+def report_page(bench):
+    report = f"{FOLDER}/report.html"
+    subprocess.run([f"{ROOT}/tests/pages/install.sh"], check=True, stdout=subprocess.DEVNULL)
+    subprocess.run(["node", f"{ROOT}/tests/pages/report_sample.mjs", f"{os.path.dirname(bench.programs)}/report_page.html", report,
+                    "50000"], check=True)
+    browser = next(filter(None, map(shutil.which, ("chromium", "chromium-browser", "google-chrome"))), None)
+    if not browser:
+        raise RuntimeError("no Chromium is installed")
+    output = subprocess.run(["node", f"{ROOT}/tests/bench/report_page_bench.mjs", report, browser, str(bench.rounds)], check=True,
+                            text=True, stdin=subprocess.DEVNULL, stdout=subprocess.PIPE).stdout
+    figures = {name: float(value) for name, value in re.findall(r"(\w+)=([0-9.]+)", output)}
+    yield Line("report-page open", f"{figures['open_ms']:.0f} ms", "-", None, 2000, figures["open_ms"])
+    yield Line("  keystroke", f"{figures['keystroke_ms']:.0f} ms", "-", None, 100, figures["keystroke_ms"])
+    yield Line("  slowest keystroke", f"{figures['worst_keystroke_ms']:.0f} ms", "-", None, 100, figures["worst_keystroke_ms"])
+    remove(report)
+
+
 ROWS = {
     "pack-mixed": ("50 MiB in 400 mixed files, against zip -6", pack("mixed", 0.60, 1.02)),
     "pack-small": ("38 MiB in 10,000 files, against zip -6", pack("small", 0.90, 1.02)),
@@ -323,6 +340,7 @@ ROWS = {
     "events": ("20,000 event records to a JSON file, against Json::StyledWriter; memory over the document", events),
     "event-queue": ("1,000 items of 10 ms: median error of the period, and processors taken; against a thread for each", event_queue),
     "upload": ("50 MiB to a tus server on loopback, against one PATCH by curl; its peak memory over idle", upload),
+    "report-page": ("a report of 50,000 events in Chromium: until its table is drawn, and from a keystroke to the rows it leaves", report_page),
     "start": ("start, first log lines, end; against an empty GUI program", start),
 }
 

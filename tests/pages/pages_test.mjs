@@ -1,14 +1,11 @@
 // The pages alone, in a browser, with a program that the test plays. ST_PAGES: their folder, ST_CHROMIUM: the browser.
 import assert from 'node:assert/strict';
-import {readFileSync} from 'node:fs';
-import {createRequire} from 'node:module';
 import {test} from 'node:test';
 import {pathToFileURL} from 'node:url';
-import {chromium} from 'playwright-core';
+import {launch, violations} from './browser.mjs';
 
-const [folder, browserPath] = [process.env.ST_PAGES, process.env.ST_CHROMIUM];
-const axe = readFileSync(createRequire(import.meta.url).resolve('axe-core/axe.min.js'), 'utf8');
-const browser = await chromium.launch({executablePath: browserPath, args: ['--no-sandbox']});
+const folder = process.env.ST_PAGES;
+const browser = await launch();
 test.after(() => browser.close());
 
 // The program as the page sees it in either engine; what was called stands in `calls`.
@@ -35,13 +32,6 @@ async function open(language, {later = false, ...options} = {}) {
   await page.addInitScript(program, later);
   await page.goto(pathToFileURL(`${folder}/support_tool_${language}.html`).href);
   return page;
-}
-
-async function violations(page) {
-  await page.evaluate(axe);
-  const result = await page.evaluate(() => globalThis.axe.run(document, {
-    runOnly: ['wcag2a', 'wcag2aa', 'wcag21a', 'wcag21aa', 'wcag22aa', 'best-practice']}));
-  return result.violations.map((v) => `${v.id}: ${v.nodes.map((n) => n.html).join(' | ')}`);
 }
 
 const section = (page) => page.evaluate(() => document.querySelector('main > section:not([hidden])').id);
