@@ -2,7 +2,9 @@
 
 #include <gtest/gtest.h>
 
-#include "core/files.h"
+#include <fstream>
+#include <iterator>
+
 #include "core/text.h"
 
 namespace {
@@ -118,8 +120,8 @@ TEST(CommandLineWarnings, LongAndRepeatedNamesMakeOneShortLine) {
 
 // The table of the documentation is that of the program.
 TEST(Options, EveryOptionIsDocumentedAsItIs) {
-  std::string document;
-  ASSERT_EQ(ReadWholeFile(ToWide(ST_SOURCE_DIR "/docs/command_line.md"), 1 << 20, document), 0u);
+  std::ifstream file(ST_SOURCE_DIR "/docs/command_line.md", std::ios::binary);
+  const std::string document{std::istreambuf_iterator<char>(file), {}};
   for (const Option& option : options::kAll) {
     std::wstring row = std::wstring(L"| `") + option.name + L"` |";
     if (*option.shortName != L'\0') row += std::wstring(L" `") + option.shortName + L"`";

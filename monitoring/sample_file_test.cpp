@@ -11,6 +11,12 @@ namespace {
 
 constexpr SYSTEMTIME kTime{2026, 1, 0, 2, 3, 4, 5, 6};
 
+TEST(SampleLine, IsAnIsoTimeAndAValueThatReadsBack) {
+  EXPECT_EQ(SampleLine(kTime, 12.5), "2026-01-02T03:04:05.006Z,12.5\r\n");
+  EXPECT_EQ(SampleLine(kTime, 0.1), "2026-01-02T03:04:05.006Z,0.1\r\n");
+  EXPECT_EQ(SampleLine(kTime, -1.7976931348623157e308), "2026-01-02T03:04:05.006Z,-1.7976931348623157e+308\r\n");
+}
+
 TEST(SampleFile, GoesOnWithAnOlderFile) {
   const TestFolder folder;
   const std::wstring path = folder.Path(L"c.csv");

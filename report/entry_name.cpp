@@ -3,6 +3,7 @@
 #include <algorithm>
 #include <iterator>
 
+#include "core/paths.h"
 #include "core/text.h"
 #include "report/windows_text.h"
 
@@ -62,6 +63,12 @@ const char* EntryNameFault(std::string_view name) {
 std::string EntryNameKey(std::string_view name) {
   if (name.ends_with('/')) name.remove_suffix(1);
   return LowerAscii(name);
+}
+
+std::wstring EntryPath(std::wstring_view folder, std::string_view name) {
+  std::wstring part = ToWide(name);
+  std::replace(part.begin(), part.end(), L'/', L'\\');
+  return std::wstring(JoinPath(folder, WithoutEndSeparators(part)));
 }
 
 }  // namespace report

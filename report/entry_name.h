@@ -20,4 +20,8 @@ const char* EntryNameFault(std::string_view name);
 // other letters the file system itself makes one, which who writes them has to notice.
 std::string EntryNameKey(std::string_view name);
 
+// Where the entry goes: `folder`, a separator, and the name with Windows' separators and none at its end. The name must
+// be safe.
+std::wstring EntryPath(std::wstring_view folder, std::string_view name);
+
 }  // namespace report

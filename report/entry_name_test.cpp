@@ -71,5 +71,12 @@ TEST(EntryName, NamesOfOneFileHaveOneKey) {
   EXPECT_NE(EntryNameKey("a/b"), EntryNameKey("ab"));
 }
 
+TEST(EntryName, BecomesAPathBelowTheFolder) {
+  for (const wchar_t* folder : {L"C:\\out", L"C:\\out\\"}) {
+    EXPECT_EQ(EntryPath(folder, "a/b.txt"), L"C:\\out\\a\\b.txt");
+    EXPECT_EQ(EntryPath(folder, "logs/"), L"C:\\out\\logs");
+  }
+}
+
 }  // namespace
 }  // namespace report

@@ -13,9 +13,7 @@ namespace {
 
 // Empty, or why the entry was not written.
 std::string WriteEntry(const Archive& archive, const ArchiveEntry& entry, std::wstring_view folder) {
-  std::wstring name = ToWide(entry.name);
-  std::replace(name.begin(), name.end(), L'/', L'\\');
-  const std::wstring path(JoinPath(folder, WithoutEndSeparators(name)));
+  const std::wstring path = EntryPath(folder, entry.name);
   const bool isFolder = entry.name.ends_with('/');
   const std::wstring parent = isFolder ? path : path.substr(0, path.find_last_of(L'\\'));
   if (const DWORD error = CreateFolders(parent); error != ERROR_SUCCESS) {

@@ -2,7 +2,10 @@
 
 #include <tinyxml2.h>
 
+#include <algorithm>
+
 #include "core/log_folder.h"
+#include "core/text.h"
 
 namespace stutil {
 namespace {
@@ -11,8 +14,25 @@ constexpr char kConfiguration[] = "configuration";
 constexpr char kDepth[] = "depth";
 constexpr char kLevel[] = "level";
 
+// The reader is content with less than a document: it ends at a stray end tag or a zero byte, and takes text beside the
+// root. Written again, such a file would lose its rest, or be one that nobody can read. Inside an element of our own
+// the reader sees all three.
+bool IsWholeDocument(std::string_view text) {
+  constexpr std::string_view kByteOrderMark = "\xEF\xBB\xBF";
+  if (text.starts_with(kByteOrderMark)) text.remove_prefix(kByteOrderMark.size());
+  text = Trimmed(text);
+  if (text.starts_with("<?")) text.remove_prefix(std::min(text.find("?>"), text.size() - 2) + 2);
+  const std::string wrapped = "<document>" + std::string(text) + "</document>";
+  tinyxml2::XMLDocument document;
+  if (document.Parse(wrapped.data(), wrapped.size()) != tinyxml2::XML_SUCCESS) return false;
+  const tinyxml2::XMLNode* node = document.RootElement()->FirstChild();
+  while (node != nullptr && node->ToText() == nullptr)
+    node = node->NextSibling();
+  return node == nullptr;
+}
+
 tinyxml2::XMLElement* Parse(std::string_view text, tinyxml2::XMLDocument& document) {
-  if (document.Parse(text.data(), text.size()) != tinyxml2::XML_SUCCESS) return nullptr;
+  if (!IsWholeDocument(text) || document.Parse(text.data(), text.size()) != tinyxml2::XML_SUCCESS) return nullptr;
   return document.FirstChildElement(kConfiguration);
 }
 
@@ -44,13 +64,12 @@ std::optional<LoggerXml> ReadLoggerXml(std::string_view text) {
 }
 
 std::optional<std::string> WithLoggerLevels(std::string_view text, const LoggerLevels& levels) {
-  // Blanks between elements are kept, so that the file still looks as its owner laid it out.
-  tinyxml2::XMLDocument document(true, tinyxml2::PEDANTIC_WHITESPACE);
+  tinyxml2::XMLDocument document(true, tinyxml2::PEDANTIC_WHITESPACE);  // an element that holds only blanks keeps them
   tinyxml2::XMLElement* const configuration = Parse(text, document);
   if (configuration == nullptr) return std::nullopt;
   SetText(*configuration, kDepth, levels.depth);
   SetText(*configuration, kLevel, levels.level);
-  tinyxml2::XMLPrinter printer(nullptr, true);  // compact: the blanks are in the document already
+  tinyxml2::XMLPrinter printer;
   document.Print(&printer);
   return std::string(printer.CStr());
 }

@@ -1,5 +1,6 @@
 // Reads and changes the two settings of a logger configuration that say how much is logged. Text in, text out; nothing
-// here opens a file. Everything but the two elements stays as it is: comments, attributes, line breaks.
+// here opens a file. Everything but the two elements stays as it is: comments, attributes, texts. Only the layout is
+// made anew, a line for each element: the reader does not keep the blanks between them.
 #pragma once
 
 #include <optional>
@@ -21,7 +22,7 @@ struct LoggerXml {
   std::string folder;  // the configured log folder
 };
 
-// Nothing when the text is not XML or has no element "configuration".
+// Nothing when the text is not one whole XML document or has no element "configuration".
 std::optional<LoggerXml> ReadLoggerXml(std::string_view text);
 
 // The text with these two settings; an element that is missing is added, one without a value is taken out.

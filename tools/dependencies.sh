@@ -1,7 +1,8 @@
 #!/usr/bin/env bash
 # Fetches the libraries that the program is built from as Debian source packages, checks each archive against
-# tools/dependencies.sha256 and builds them static for mingw-w64.
-# usage: tools/dependencies.sh FOLDER     result: FOLDER/install, a CMAKE_PREFIX_PATH. A finished step is not repeated.
+# tools/dependencies.sha256 and builds them static: for mingw-w64, or for this machine under Clang's sanitizers.
+# usage: tools/dependencies.sh FOLDER [native]
+# result: FOLDER/install, or FOLDER/install-native, a CMAKE_PREFIX_PATH. A finished step is not repeated.
 set -euo pipefail
 
 tools=$(cd "$(dirname "$0")" && pwd)
@@ -9,9 +10,16 @@ source_root=$(dirname "$tools")
 mkdir -p "$1"
 cd "$1"
 
+suffix=${2:+-$2}
+case $suffix in
+  '') toolchain=$source_root/cmake/windows-cross.cmake ;;
+  -native) toolchain=$source_root/cmake/native-sanitized.cmake ;;
+  *) echo "tools/dependencies.sh: the libraries are not built for '$2'" >&2 && exit 1 ;;
+esac
+
 sums=$tools/dependencies.sha256
-stamp=install/built-from
-inputs() { cat "$sums" "$tools/dependencies.sh" "$source_root"/cmake/dependencies/*/CMakeLists.txt "$source_root/cmake/windows-cross.cmake" | sha256sum; }
+stamp=install$suffix/built-from
+inputs() { cat "$sums" "$tools/dependencies.sh" "$source_root"/cmake/dependencies/*/CMakeLists.txt "$toolchain" | sha256sum; }
 [ -f "$stamp" ] && [ "$(cat "$stamp")" = "$(inputs)" ] && exit 0
 
 say() { printf '    %s\n' "$*"; }
@@ -59,13 +67,13 @@ build() { # NAME SOURCE [cmake options]
   shift 2
   say "building $name"
   {
-    cmake -G Ninja -S "$source" -B "build/$name" -DCMAKE_BUILD_TYPE=Release -DBUILD_SHARED_LIBS=OFF \
-      -DCMAKE_TOOLCHAIN_FILE="$source_root/cmake/windows-cross.cmake" -DCMAKE_INSTALL_PREFIX="$PWD/install" "$@"
-    cmake --build "build/$name" --target install
-  } > "build-$name.log" 2>&1 || { tail -n 30 "build-$name.log" >&2; exit 1; }
+    cmake -G Ninja -S "$source" -B "build$suffix/$name" -DCMAKE_BUILD_TYPE=Release -DBUILD_SHARED_LIBS=OFF \
+      -DCMAKE_TOOLCHAIN_FILE="$toolchain" -DCMAKE_INSTALL_PREFIX="$PWD/install$suffix" "$@"
+    cmake --build "build$suffix/$name" --target install
+  } > "build$suffix-$name.log" 2>&1 || { tail -n 30 "build$suffix-$name.log" >&2; exit 1; }
 }
 
-rm -rf build install
+rm -rf "build$suffix" "install$suffix"
 unpack jsoncpp libjsoncpp
 unpack yaml libyaml
 unpack tinyxml2 tinyxml2

@@ -153,7 +153,7 @@ std::optional<std::wstring> PathInside(std::wstring_view uri, std::wstring_view 
   if (folder.empty() || !StartsWith(uri, kSchemes[0].engine)) return {};
   std::wstring path(uri.substr(kSchemes[0].engine.size()));
   std::replace(path.begin(), path.end(), L'/', L'\\');
-  const bool isInside = StartsWith(path, folder) && path.size() > folder.size() && path[folder.size()] == L'\\';
+  const bool isInside = StartsWith(path, folder) && path.size() > folder.size() + 1 && path[folder.size()] == L'\\';
   // Nothing that leads out of the folder, and no stream of a file.
   if (!isInside || HasParentStep(path) || path.find(L':', folder.size()) != std::wstring::npos) return {};
   return path;

@@ -49,9 +49,9 @@ TEST(ResourceAddress, OnlyWhatLiesInThePagesFolderIsReadFromTheDisk) {
   const wchar_t* folder = L"C:\\pages";
   EXPECT_EQ(PathInside(L"file://C:/pages/sub/a.css", folder), L"C:\\pages\\sub\\a.css");
   EXPECT_EQ(PathInside(L"file://c:/PAGES/a.css", folder), L"c:\\PAGES\\a.css");
-  for (const wchar_t* uri :
-       {L"file://C:/pages", L"file://C:/pagesx/a", L"file://C:/pages/../a", L"file://C:/pages/x/../../a",
-        L"file://C:/pages/..\\a", L"file://C:/pages/a.txt:stream", L"file://D:/pages/a", L"res:a"}) {
+  for (const wchar_t* uri : {L"file://C:/pages", L"file://C:/pages/", L"file://C:/pagesx/a", L"file://C:/pages/../a",
+                             L"file://C:/pages/x/../../a", L"file://C:/pages/..\\a", L"file://C:/pages/a.txt:stream",
+                             L"file://D:/pages/a", L"res:a"}) {
     EXPECT_FALSE(PathInside(uri, folder)) << uri;
   }
   EXPECT_FALSE(PathInside(L"file://C:/a", L""));

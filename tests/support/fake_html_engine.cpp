@@ -26,7 +26,7 @@ std::vector<qx::Value> Plain(FakeHtmlEngine& engine, const HtmlValue* values, ui
 struct FakeHtmlEngineTable {
   static Node& Get(const HtmlValue* value) {
     static Node s_undefined;
-    if (GetCurrentThreadId() != g_engine->m_thread) ++g_engine->callsFromOtherThreads;
+    if (std::this_thread::get_id() != g_engine->m_thread) ++g_engine->callsFromOtherThreads;
     if (value->data == 0) return s_undefined = Node();
     const auto found = g_engine->m_values.find(value->data);
     if (found == g_engine->m_values.end()) throw std::logic_error("a script value was used after its end");
@@ -187,7 +187,7 @@ struct FakeHtmlEngineTable {
     return TRUE;
   }
   static BOOL CALLBACK Call(HWND, const char* name, uint32_t argc, const HtmlValue* argv, HtmlValue* result) {
-    if (GetCurrentThreadId() != g_engine->m_thread) ++g_engine->callsFromOtherThreads;
+    if (std::this_thread::get_id() != g_engine->m_thread) ++g_engine->callsFromOtherThreads;
     const auto found = g_engine->functions.find(name);
     if (found == g_engine->functions.end()) return FALSE;
     const FakeHtmlEngine::Function function = found->second;

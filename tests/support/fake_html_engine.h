@@ -7,6 +7,7 @@
 #include <functional>
 #include <map>
 #include <string>
+#include <thread>
 #include <utility>
 #include <vector>
 
@@ -77,7 +78,7 @@ class FakeHtmlEngine {
   friend struct FakeHtmlEngineTable;
 
   HtmlEngineApi m_api{};
-  const DWORD m_thread = GetCurrentThreadId();
+  const std::thread::id m_thread = std::this_thread::get_id();
   std::map<uint64_t, Node> m_values;
   uint64_t m_lastId = 0;
 };
