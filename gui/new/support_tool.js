@@ -201,7 +201,9 @@
     var state = native.call("get_state");
     byId("failure-text").textContent = text(key);
     byId("failure-help").textContent = text(key + "_help");
-    byId("failure-package").textContent = text(state.package ? "failure_package" : "failure_nothing");
+    var isUnsent = key === "submission_failed"; // the maker chooses whether such a package waits for the next run
+    byId("failure-package").textContent =
+      text(state.package ? "failure_package" : isUnsent ? "failure_unsent" : "failure_nothing");
     byId("failure-path").textContent = state.package || "";
     show("failure");
   }

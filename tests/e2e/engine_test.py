@@ -11,6 +11,7 @@ import time
 import unittest
 
 sys.path.insert(0, str(pathlib.Path(__file__).resolve().parents[1] / "support"))
+from browsers import browser_processes, processor_seconds  # noqa: E402
 from engine_host import EngineHost, windows_path  # noqa: E402
 from x_session import XSession  # noqa: E402
 
@@ -37,38 +38,8 @@ def at(x, y):
     return y << 16 | x
 
 
-def browser_processes():
-    """Unix processes of browsers that engines have started, watches included."""
-    found = []
-    for line in pathlib.Path("/proc").glob("[0-9]*/cmdline"):
-        try:
-            if b"st-engine-" in line.read_bytes():
-                found.append(int(line.parent.name))
-        except OSError:
-            pass
-    return found
-
-
 def profiles():
     return glob.glob("/tmp/st-engine-*")
-
-
-def gone_within(seconds):
-    deadline = time.monotonic() + seconds
-    while time.monotonic() < deadline and (browser_processes() or profiles()):
-        time.sleep(0.2)
-    return not browser_processes() and not profiles()
-
-
-def processor_seconds(pids):
-    total = 0
-    for pid in pids:
-        try:
-            fields = pathlib.Path(f"/proc/{pid}/stat").read_text().rsplit(")", 1)[1].split()
-            total += int(fields[11]) + int(fields[12])
-        except OSError:
-            pass
-    return total / os.sysconf("SC_CLK_TCK")
 
 
 class EngineTest(unittest.TestCase):
@@ -84,6 +55,15 @@ class EngineTest(unittest.TestCase):
         self.folder = pathlib.Path(self._folder.name) / "pages 100%"
         self.folder.mkdir()
         (self.folder / "own.css").write_text("p { color: rgb(1, 2, 3) }")
+
+    def browsers(self):
+        return browser_processes(self.session)
+
+    def gone_within(self, seconds):
+        deadline = time.monotonic() + seconds
+        while time.monotonic() < deadline and (self.browsers() or profiles()):
+            time.sleep(0.2)
+        return not self.browsers() and not profiles()
 
     def open(self, script, *arguments, page=PAGE):
         (self.folder / "index.htm").write_text(page.replace("SCRIPT", script), encoding="utf-8")
@@ -242,11 +222,11 @@ class EngineTest(unittest.TestCase):
     def test_closing_ends_the_browser_and_deletes_its_profile(self):
         host = self.open("")
         host.wait_for("shown")
-        self.assertTrue(browser_processes() and profiles())
+        self.assertTrue(self.browsers() and profiles())
         host.send("close")
         host.wait_for("engine destroyed")
         self.assertEqual(host.wait(), 0)
-        self.assertTrue(gone_within(6), (browser_processes(), profiles()))
+        self.assertTrue(self.gone_within(6), (self.browsers(), profiles()))
 
     def test_page_may_close_its_window_in_a_call(self):
         host = self.open("setTimeout(() => { view.closeWindow(); view.echo(1); }, 300)")
@@ -261,12 +241,12 @@ class EngineTest(unittest.TestCase):
         host.wait_for("shown")
         host.send("abort")
         self.assertEqual(host.wait(), 3)
-        self.assertTrue(gone_within(40), (browser_processes(), profiles()))
+        self.assertTrue(self.gone_within(40), (self.browsers(), profiles()))
 
     def test_browser_that_dies_is_reported(self):
         host = self.open("function add(a) { return a; }")
         host.wait_for("shown")
-        for pid in browser_processes():
+        for pid in self.browsers():
             try:
                 os.kill(pid, signal.SIGKILL)
             except ProcessLookupError:
@@ -293,13 +273,13 @@ class EngineTest(unittest.TestCase):
             self.assertTrue(host.wait_for("loaded").startswith("0"))
             self.assertEqual(host.wait(), 1)
             self.assertIn(report, "\n".join(host.lines))
-        self.assertTrue(gone_within(40))
+        self.assertTrue(self.gone_within(40))
 
     def test_idle_page_costs_little(self):
         host = self.open("")
         host.wait_for("shown")
         time.sleep(3)
-        pids = browser_processes() + [int(pid) for pid in subprocess.run(
+        pids = self.browsers() + [int(pid) for pid in subprocess.run(
             ["pgrep", "-f", "engine_host.exe"], capture_output=True, text=True, check=False).stdout.split()]
         before = processor_seconds(pids)
         time.sleep(10)

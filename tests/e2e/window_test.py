@@ -13,12 +13,13 @@ import time
 import unittest
 
 sys.path.insert(0, str(pathlib.Path(__file__).resolve().parents[1] / "support"))
+from browsers import browser_processes, processor_seconds  # noqa: E402
 from fault_proxy import FaultProxy, Faults  # noqa: E402
 from ingest import IngestServer  # noqa: E402
 from open_package import open_package  # noqa: E402
 from report_walk import ANSWERS, ReportWalk, choose_language  # noqa: E402
 from support_tool import BIN, PRIVATE_KEY, Stage, read_archive, windows_path  # noqa: E402
-from window_driver import Window, browser_processes, wait_for  # noqa: E402
+from window_driver import Window, wait_for  # noqa: E402
 from x_session import XSession  # noqa: E402
 
 PICTURES = pathlib.Path(os.environ.get("ST_PICTURES", BIN.parent.parent / "screenshots/gui"))
@@ -60,6 +61,7 @@ class InteractiveStage(Stage):
 class WindowTest(unittest.TestCase):
     @classmethod
     def setUpClass(cls):
+        cls.painted = []  # seconds from each start to the picture
         cls.session = XSession(has_manager=True)
         cls.session.__enter__()
         cls.addClassCleanup(cls.session.__exit__)
@@ -73,7 +75,9 @@ class WindowTest(unittest.TestCase):
 
     def open(self, *arguments):
         command = [windows_path(self.stage.path("support_tool.exe")), *arguments]
-        return self.enterContext(Window(self.session, command, self.stage.folder))
+        window = self.enterContext(Window(self.session, command, self.stage.folder))
+        self.painted.append(window.painted_after)
+        return window
 
     def server(self):
         return self.enterContext(IngestServer(self.received))
@@ -207,6 +211,44 @@ class WindowTest(unittest.TestCase):
         window.fill("#name", "Ana")
         window.click("#close")
         self.assertEnded(window)
+
+    def test_starting_input_and_waiting_take_little(self):
+        """The best of several counts: the others say what else the machine had to do."""
+        window = self.open()
+        print(f"painted {min(self.painted):.2f} s after the start", file=sys.stderr)
+        self.assertLess(min(self.painted), 3)
+        wait_for("the page to be at rest", lambda: self.share_of_a_core(window, 1) < 0.02)
+        share = self.share_of_a_core(window, 5)
+        print(f"idle costs {share * 100:.1f} % of a core", file=sys.stderr)
+        self.assertLess(share, 0.02)
+        window.point_at("#consent")
+        wait_for("the highlight", lambda: window.read("document.getElementById('consent').matches(':hover')"))
+        times = []
+        for _ in range(5):
+            area = window.area("#consent")
+            wait_for("the picture to be at rest", lambda area=area: self.is_at_rest(window, area))
+            before, begin = window.screen.pixels(area), time.monotonic()
+            window.press()
+            while window.screen.pixels(area) == before:
+                self.assertLess(time.monotonic() - begin, 5)
+            times.append(time.monotonic() - begin)
+        print(f"a click is seen after {min(times) * 1000:.0f} ms", file=sys.stderr)
+        self.assertLess(min(times), 0.1)
+        window.point_elsewhere()
+        wait_for("the highlight to go", lambda: not window.read("document.getElementById('consent').matches(':hover')"))
+
+    @staticmethod
+    def is_at_rest(window, area):
+        before = window.screen.pixels(area)
+        time.sleep(0.2)
+        return window.screen.pixels(area) == before
+
+    def share_of_a_core(self, window, seconds):
+        """What the program and its browser use."""
+        pids = [window.process.pid, *browser_processes(self.session)]
+        before = processor_seconds(pids)
+        time.sleep(seconds)
+        return (processor_seconds(pids) - before) / seconds
 
 
 if __name__ == "__main__":

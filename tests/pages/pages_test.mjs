@@ -154,12 +154,15 @@ test('a failure says what to do, where the package lies, and can be tried again'
   await page.waitForSelector('#reproduce-message:visible');
   await page.click('#reproduce-next');
   await page.click('#send-button');
-  for (const [code, kept] of [['submission_failed', true], ['collect_canceled', false], ['unknown', false],
-                              ['something new', false], [{odd: 1}, false]]) {
+  for (const [code, kept, says] of [
+    ['submission_failed', true, /was kept/], ['submission_failed', false, /set up to keep/],
+    ['collect_canceled', false, /^Nothing/], ['unknown', false, /^Nothing/], ['something new', false, /^Nothing/],
+    [{odd: 1}, false, /^Nothing/]]) {
     await page.evaluate((k) => { globalThis.answers.get_state = k ? {package: 'C:\\x\\collected.zip'} : {}; }, kept);
     await notify(page, 'on_error', code);
     assert.equal(await section(page), 'failure');
     assert.notEqual(await page.textContent('#failure-help'), '');
+    assert.match(await page.textContent('#failure-package'), says);
     assert.equal(await page.textContent('#failure-path'), kept ? 'C:\\x\\collected.zip' : '');
     assert.deepEqual(await violations(page), []);
     await page.click('#retry');
@@ -177,6 +180,21 @@ test('dark colours, a narrow window and high magnification hold the rules too', 
     assert.deepEqual(await violations(page), []);
     const overflow = await page.evaluate(() => document.documentElement.scrollWidth - window.innerWidth);
     assert.ok(overflow <= 0, `the page is ${overflow} pixels too wide`);
+    await page.close();
+  }
+});
+
+test('every page fits into the window, with all that can be wrong on it', async () => {
+  for (const language of ['en', 'ro']) {
+    const page = await open(language, {viewport: {width: 900, height: 720}});
+    const heights = await page.evaluate(() => Array.from(document.querySelectorAll('main > section'), (section) => {
+      for (const other of document.querySelectorAll('main > section')) other.hidden = other !== section;
+      const fields = section.querySelectorAll('.field .error, fieldset .error');
+      for (const error of fields) error.hidden = false;
+      const main = document.getElementById('main');
+      return [section.id, main.scrollHeight - main.clientHeight];
+    }));
+    assert.deepEqual(heights.filter(([, tooHigh]) => tooHigh > 0), [], language);
     await page.close();
   }
 });

@@ -3,12 +3,12 @@ server (xdotool); where things are on the page, and what it says, is read over t
 """
 import contextlib
 import os
-import pathlib
 import shutil
 import signal
 import subprocess
 import time
 
+from browsers import processes_of, profiles_in_use
 from page_probe import PageProbe, ProbeError
 from screen import Screen
 
@@ -41,21 +41,6 @@ def wait_for(what, condition, seconds=TIMEOUT):
         time.sleep(0.02)
 
 
-def browser_processes(prefix):
-    """{process: profile folder} of the browsers that programs of a Wine prefix have started, watches included."""
-    found = {}
-    for process in pathlib.Path("/proc").glob("[0-9]*"):
-        with contextlib.suppress(OSError):
-            command = (process / "cmdline").read_bytes()
-            if b"st-engine-" not in command or os.fsencode(f"WINEPREFIX={prefix}") not in (
-                    process / "environ").read_bytes().split(b"\0"):
-                continue
-            profile = [part for part in command.split(b"\0") if b"st-engine-" in part][-1]
-            profile = profile.removeprefix(b"--user-data-dir=").removesuffix(b".life").decode()
-            found[int(process.name)] = pathlib.Path(profile)
-    return found
-
-
 def start(session, command, folder):
     return subprocess.Popen(["wine", *command], cwd=folder, env=session.environment, stdin=subprocess.DEVNULL,
                             stdout=subprocess.DEVNULL, stderr=subprocess.DEVNULL)
@@ -65,8 +50,8 @@ class Window:
     """The program's window from its start to the end of the process. `command` is the program with its arguments."""
 
     def __init__(self, session, command, folder):
+        self._session = session
         self._environment = session.environment
-        self._prefix = session.environment["WINEPREFIX"]
         self.screen = Screen(session.frame_buffer)
         self.handle = None
         self.page = None
@@ -77,6 +62,9 @@ class Window:
     def __enter__(self):
         try:
             self.handle = wait_for("the window", self._find)
+            x, y, width, height = self.place()
+            wait_for("the picture", lambda: any(self.screen.colour(x + width // 2, y + height // 2)))
+            self.painted_after = time.monotonic() - self.started
             self.page = wait_for("the page", self._connect)
             wait_for("the first section", lambda: self.read("document.readyState") == "complete")
         except BaseException:
@@ -90,7 +78,7 @@ class Window:
         if self.process.poll() is None:  # the test has failed, or has seen enough
             self.process.kill()
             self.process.wait()
-            for pid in browser_processes(self._prefix):
+            for pid in processes_of([self.profile] if self.profile else []):
                 with contextlib.suppress(ProcessLookupError):
                     os.kill(pid, signal.SIGKILL)
             if self.profile:
@@ -118,7 +106,7 @@ class Window:
         return []
 
     def _connect(self):
-        for profile in browser_processes(self._prefix).values():
+        for profile in profiles_in_use(self._session):
             with contextlib.suppress(OSError, ProbeError, ValueError, IndexError):
                 page = PageProbe(profile)
                 self.profile = profile
@@ -130,6 +118,12 @@ class Window:
         answer = self._xdotool("getwindowgeometry", "--shell", self.handle)
         values = dict(line.split("=") for line in answer.split())
         return tuple(int(values[name]) for name in ("X", "Y", "WIDTH", "HEIGHT"))
+
+    def area(self, element):
+        """The rectangle of an element on the screen."""
+        x, y, _, _ = self.place()
+        box = self._box(element)
+        return round(x + box["x"]), round(y + box["y"]), round(box["width"]), round(box["height"])
 
     def is_visible(self):
         return self.handle in self._visible()
@@ -157,7 +151,7 @@ class Window:
 
     def shoot(self, path):
         """A picture of the window, when it has stopped changing."""
-        self._xdotool("mousemove", 0, 0)
+        self.point_elsewhere()
         place, before = self.place(), None
         deadline = time.monotonic() + 2  # a clock on the page never stops
         while (now := self.screen.pixels(place)) != before and time.monotonic() < deadline:
@@ -170,7 +164,7 @@ class Window:
     def _box(self, element):
         return wait_for(f"element {element}", lambda: self.read(BOX % element))
 
-    def _point_at(self, element, at=None):
+    def point_at(self, element):
         """Moves the mouse onto an element; rolls the wheel first when it lies outside of what the window shows."""
         for _ in range(30):
             box = self._box(element)
@@ -180,9 +174,8 @@ class Window:
             self._xdotool("mousemove", x + width // 2, y + height * 2 // 3, "click", 4 if box["above"] > 0 else 5)
             wait_for("scrolling", lambda box=box: self._box(element) != box)
             self._settle(element)
-        x, y, _, _ = self.place()
-        dx, dy = at or (box["width"] / 2, box["height"] / 2)
-        self._xdotool("mousemove", round(x + box["x"] + dx), round(y + box["y"] + dy))
+        x, y, width, height = self.area(element)
+        self._xdotool("mousemove", x + width // 2, y + height // 2)
 
     def _settle(self, element):
         before = None
@@ -190,8 +183,15 @@ class Window:
             before = now
             time.sleep(0.05)
 
-    def click(self, element, at=None):
-        self._point_at(element, at)
+    def point_elsewhere(self):
+        self._xdotool("mousemove", 0, 0)
+
+    def click(self, element):
+        self.point_at(element)
+        self.press()
+
+    def press(self):
+        """Clicks where the mouse is."""
         self._xdotool("click", 1)
 
     def type(self, text, delay=15):
@@ -227,7 +227,7 @@ class Window:
 
     def drag(self, element, dx, dy):
         """Drags the window by an element of the page, in steps as a hand does."""
-        self._point_at(element)
+        self.point_at(element)
         self._xdotool("mousedown", 1)
         for _ in range(10):
             self._xdotool("mousemove_relative", "--", dx // 10, dy // 10)
@@ -246,6 +246,6 @@ class Window:
             code = self.process.wait(seconds)
         except subprocess.TimeoutExpired:
             raise AssertionError(f"the program does not end within {seconds} seconds") from None
-        wait_for("the end of the browser", lambda: not browser_processes(self._prefix), 30)
+        wait_for("the end of the browser", lambda: not processes_of([self.profile]), 30)
         wait_for("the end of the profile", lambda: not self.profile.exists())
         return code
