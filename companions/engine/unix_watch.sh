@@ -1,8 +1,12 @@
 # shellcheck shell=sh
-# For sh -c LIFE PROFILE BROWSER ARGUMENTS: ends the browser when LIFE is no longer touched, and leaves nothing behind.
-life=$1; profile=$2; shift 2
+# For sh -c MARK PROFILE BROWSER ARGUMENTS: ends the browser when MARK is gone, and leaves nothing behind. The system of the
+# one who made MARK deletes it with him; if that system itself was killed, MARK is no longer touched.
+mark=$1; profile=$2; shift 2
 "$@" </dev/null >/dev/null 2>"$profile/browser.log" & browser=$!
-while kill -0 $browser 2>/dev/null && [ -n "$(find "$life" -mmin -0.35 2>/dev/null)" ]; do sleep 1; done
+is_touched() { [ -n "$(find "$mark" -mmin -0.35 2>/dev/null)" ]; }
+# A machine that slept looks like a mark that nobody touches, for a moment.
+is_owned() { is_touched || { [ -e "$mark" ] && sleep 6 && is_touched; }; }
+while kill -0 $browser 2>/dev/null && is_owned; do sleep 1; done
 kill $browser 2>/dev/null && sleep 1; kill -9 $browser 2>/dev/null
-[ -e "$life" ] && : >"$profile.ended" && sleep 5
-rm -rf "$profile" "$profile.ended" "$life" "$life.partial"
+[ -e "$mark" ] && : >"$profile/ended" && sleep 5
+rm -rf "$profile" "$mark"
