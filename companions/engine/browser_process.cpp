@@ -30,9 +30,10 @@ struct AttributeListTraits {
 };
 using AttributeList = Scoped<AttributeListTraits>;
 
+// Nobody can know it before. Empty on failure.
 std::wstring RandomName() {
   unsigned char bytes[16] = {};
-  BCryptGenRandom(nullptr, bytes, sizeof bytes, BCRYPT_USE_SYSTEM_PREFERRED_RNG);
+  if (BCryptGenRandom(nullptr, bytes, sizeof bytes, BCRYPT_USE_SYSTEM_PREFERRED_RNG) != 0) return {};
   std::wstring name = kProfilePrefix;
   for (const unsigned char byte : bytes)
     name += Format(L"%02x", byte);
@@ -52,21 +53,20 @@ void Touch(HANDLE file) {
   SetFileTime(file, nullptr, nullptr, &now);
 }
 
-// A mark whose owner lives cannot be deleted; one that a power failure left can. What another Unix user's system knows
-// of its files is not known here: there a mark counts as long as it is there.
-bool HasOwner(const std::wstring& mark, bool isUnix) {
-  return PathExists(mark) && (isUnix || !DeleteFileW(ExtendedPath(mark).c_str()));
+// A mark whose owner lives cannot be deleted; one that a power failure left can.
+bool HasOwner(const std::wstring& mark) {
+  return PathExists(mark) && !DeleteFileW(ExtendedPath(mark).c_str());
 }
 
-// Deletes the profiles of processes that were killed.
-void DeleteOrphans(const std::wstring& parent, bool isUnix) {
+// Deletes the profiles of processes that were killed. Those of Unix browsers are the watching shell's affair.
+void DeleteOrphans(const std::wstring& parent) {
   WIN32_FIND_DATAW data{};
   const FindHandle find(FindFirstFileW(ExtendedPath(parent + kProfilePrefix + L"*").c_str(), &data));
   if (!find) return;
   do {
     const std::wstring path = parent + data.cFileName;
     const bool isFolder = (data.dwFileAttributes & FILE_ATTRIBUTE_DIRECTORY) != 0;
-    if (isFolder && !HasOwner(path + kMarkSuffix, isUnix)) DeleteFolder(path, true);
+    if (isFolder && !HasOwner(path + kMarkSuffix)) DeleteFolder(path, true);
   } while (FindNextFileW(find.Get(), &data));
 }
 
@@ -88,7 +88,12 @@ bool BrowserProcess::MakeProfile(const std::wstring& program, std::wstring& erro
   GetTempPathW(MAX_PATH + 1, temporary);
   // A Unix program needs a folder whose Unix path is known.
   const std::wstring parent = m_isUnix ? program.substr(0, 2) + L"\\tmp\\" : std::wstring(temporary);
-  m_profile = parent + RandomName();
+  const std::wstring name = RandomName();
+  if (name.empty()) {
+    error = L"no random name for the browser's profile";
+    return false;
+  }
+  m_profile = parent + name;
   m_mark = m_profile + kMarkSuffix;
   m_markHandle = MakeMark(m_mark);  // before the folder, so that nobody takes it for an orphan
   if (!m_markHandle) {
@@ -96,7 +101,7 @@ bool BrowserProcess::MakeProfile(const std::wstring& program, std::wstring& erro
     m_profile.clear();
     return false;
   }
-  DeleteOrphans(parent, m_isUnix);
+  if (!m_isUnix) DeleteOrphans(parent);
   if (const DWORD result = CreatePrivateFolder(m_profile); result != ERROR_SUCCESS) {
     error = Format(L"the browser's profile folder '%s' cannot be made, error %u", m_profile.c_str(), result);
     m_profile.clear();
