@@ -7,8 +7,10 @@ for old in "${profile%/*}"/st-engine-*; do [ -d "$old" ] && [ ! -e "$old.life" ]
 TMPDIR=$profile "$@" </dev/null >/dev/null 2>"$profile/browser.log" & browser=$!
 is_touched() { [ -n "$(find "$mark" -mmin -0.35 2>/dev/null)" ]; }
 # A machine that slept looks like a mark that nobody touches, for a moment.
-is_owned() { is_touched || { [ -e "$mark" ] && sleep 6 && is_touched; }; }
+is_owned() { is_touched || { [ -e "$mark" ] && sleep 5 && is_touched; }; }
 while kill -0 $browser 2>/dev/null && is_owned; do sleep 1; done
 kill $browser 2>/dev/null && sleep 1; kill -9 $browser 2>/dev/null
 is_touched && : >"$profile/ended" && sleep 5
 rm -rf "$profile" "$mark"
+# The browser's other processes notice its end a little later, and may have written once more.
+sleep 1; rm -rf "$profile"

@@ -3,6 +3,7 @@ or a crash."""
 import json
 import os
 import pathlib
+import signal
 import subprocess
 import sys
 import unittest
@@ -44,9 +45,10 @@ class WindowFaults(unittest.TestCase):
         cls.session = cls.enterClassContext(XSession())
         cls.stage = InteractiveStage(cls.session)
         cls.addClassCleanup(cls.stage.close)
+        cls.traces = cls.stage.traces
 
     def setUp(self):
-        self.addCleanup(self.stage.traces.kill)
+        self.addCleanup(self.traces.kill)
         self.mark = self.stage.mark()
 
     def open(self):
@@ -95,7 +97,7 @@ class WindowFaults(unittest.TestCase):
         self.assertEqual(page.read("view.translate('close').translation"), "Close")
         self.close(process, page)
         self.assertNotIn("unexpected failure", self.log())
-        self.stage.traces.seconds_until_gone(8)
+        self.traces.seconds_until_gone(8)
 
     def test_calls_in_the_moment_of_closing_do_no_harm(self):
         process, page = self.open_page()
@@ -104,16 +106,28 @@ class WindowFaults(unittest.TestCase):
                                 catch (error) { } } }, 1);
             setTimeout(() => view.xcall('close'), 300); })()""")
         self.assertEqual(process.wait(20), 0)
-        self.stage.traces.seconds_until_gone(8)
+        self.traces.seconds_until_gone(8)
 
     def test_browser_that_dies_is_said_and_logging_is_put_back(self):
         process, page = self.open_page()
         page.read("view.start_issue_reproduction()")
         self.assertTrue(self.stage.is_raised())
-        self.stage.traces.kill()
+        self.traces.kill()
         self.read_the_message(process)
         self.assertTrue(self.stage.is_as_before())
         self.assertIn("the page is lost; the window is closed", self.log())
+
+    def test_browser_that_hangs_does_not_keep_the_window(self):
+        process, page = self.open_page()
+        page.read("view.start_issue_reproduction()")
+        for pid in self.traces.processes():
+            if (pathlib.Path("/proc") / str(pid) / "comm").read_text().startswith("chrom"):
+                os.kill(pid, signal.SIGSTOP)
+        self.assertTrue(self.stage.is_raised())
+        self.wine("taskkill", "/im", "support_tool.exe")  # as Windows' own list of tasks does
+        self.assertEqual(process.wait(20), 0)
+        self.assertTrue(self.stage.is_as_before())
+        self.traces.seconds_until_gone(8)
 
     def test_browser_that_cannot_be_used_is_said(self):
         broken = self.stage.path("broken")
