@@ -28,6 +28,10 @@ static_assert(static_cast<int>(qx::kCollectSuccess) == st::kCollectDone &&
               static_cast<int>(qx::kCompressionFailed) == st::kCompressFailed &&
               static_cast<int>(qx::kSubmissionFailed) == st::kSubmitFailed);
 
+void ShowMessage(HWND owner, const std::wstring& text) {
+  MessageBoxW(owner, text.c_str(), L"Support Tool", MB_OK | MB_ICONERROR | MB_SETFOREGROUND);
+}
+
 qx::TisServices Services(qx::Application& application, CollectParameters parameters) {
   qx::TisServices services;
   services.engine = &qx::gui::Engine();
@@ -45,6 +49,7 @@ qx::TisServices Services(qx::Application& application, CollectParameters paramet
     const qx::ComponentManager manager(catalogue);
     return qx::ServPlugin<qx::ILanguageManager>::GetPlugin(&manager);
   };
+  services.showMessage = &ShowMessage;
   services.productConfig = [&application] { return application.ProductConfig(); };
   return services;
 }

@@ -9,6 +9,7 @@
 #include "core/program_path.h"
 #include "core/text.h"
 #include "core/text_table.h"
+#include "gui/window_messages.h"
 
 namespace {
 
@@ -81,6 +82,11 @@ TEST(Catalogues, HaveExactlyTheTextsThatThePagesUse) {
     used.insert("progress_" + stage);
   for (const std::string& word : Matches(script, "texts\\.(\\w+)"))
     used.insert(word);
+  // The program's own, which it looks up by their English text.
+  const TextTable english = Catalogue(L"en");
+  EXPECT_EQ(english.at(L"page_failed"), qx::kPageFailedText);
+  EXPECT_EQ(english.at(L"page_lost"), qx::kPageLostText);
+  used.insert({"page_failed", "page_lost"});
   EXPECT_EQ(used, keys);
 }
 

@@ -1,6 +1,8 @@
 // What the issue-report window needs of the rest of the program. Handed in, because the collection lies a floor above.
 #pragma once
 
+#include <windows.h>
+
 #include <atomic>
 #include <functional>
 #include <memory>
@@ -41,6 +43,9 @@ struct TisServices {
 
   // The language manager for a catalogue, or null. Called once, when a text is first asked for.
   std::function<std::shared_ptr<ILanguageManager>(const std::wstring& catalogue)> languageManager;
+
+  // Tells the user something and comes back when he has read it, meanwhile handling messages. The owner's thread.
+  std::function<void(HWND owner, const std::wstring& text)> showMessage;
 
   // What the product is called, or null.
   std::function<std::shared_ptr<IServConfig>()> productConfig;

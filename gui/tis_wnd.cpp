@@ -8,6 +8,7 @@
 #include "core/text.h"
 #include "gui/install_info.h"
 #include "gui/language.h"
+#include "gui/window_messages.h"
 
 namespace {
 
@@ -119,6 +120,23 @@ void TisWnd::OnDestroyed() {
 
 void TisWnd::OnLoadFailed() {
   LOG_ERROR(kInitScope, L"Failed to create window from file '%s'", m_pagePath.c_str());
+  if (Handle() != nullptr) Tell(qx::kPageFailedText);  // where no window can be, no message can
+}
+
+// What a user records, he can no longer stop.
+void TisWnd::OnPageLost() {
+  LOG_ERROR(L"TisWnd::OnPageLost", L"the page is lost; the window is closed");
+  m_cancel = true;
+  RestoreLogging();
+  Tell(qx::kPageLostText);
+  if (Handle() != nullptr) PostMessageW(Handle(), WM_CLOSE, 0, 0);
+}
+
+void TisWnd::Tell(const wchar_t* text) {
+  const std::shared_ptr<qx::ILanguageManager> manager = Language();
+  std::wstring translation;
+  const bool isTranslated = manager != nullptr && manager->Translate(text, translation) == 0;
+  m_services.showMessage(Handle(), isTranslated ? translation : text);
 }
 
 void TisWnd::RestoreLogging() {

@@ -40,6 +40,7 @@ class TisWnd : public qx::gui::Window {
   bool OnMessage(UINT message, WPARAM wparam, LPARAM lparam, LRESULT& result) override;
   void OnDestroyed() override;
   void OnLoadFailed() override;
+  void OnPageLost() override;
   qx::Value on_script_call(const std::wstring& name, uint32_t count, const HtmlValue* arguments) override;
 
  private:
@@ -51,6 +52,7 @@ class TisWnd : public qx::gui::Window {
   static const HandlerEntry kHandlers[];
 
   void Subscribe();
+  void Tell(const wchar_t* text);
 
   // The bridge.
   qx::Value CallSynchronously(const std::wstring& topic, qx::Value request);
@@ -99,6 +101,7 @@ class TisWnd : public qx::gui::Window {
   std::atomic<bool> m_cancel{false};
   std::atomic<bool> m_isSubmitting{false};
   std::atomic<bool> m_isReproducing{false};
+  std::atomic<bool> m_isClosing{false};  // the page has asked for it: answers that wait would only be in the way
 
   // The script functions that wait for an answer; they never leave this thread.
   std::map<uint64_t, std::unique_ptr<qx::gui::EngineValue>> m_callbacks;

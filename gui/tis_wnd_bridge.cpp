@@ -89,6 +89,7 @@ void TisWnd::AnswerScript(uint64_t callback, const qx::Value& response) {
   if (found == m_callbacks.end()) return;
   const std::unique_ptr<qx::gui::EngineValue> function = std::move(found->second);
   m_callbacks.erase(found);  // before the call, in which the script may call again
+  if (m_isClosing) return;
   try {
     qx::gui::EngineValue argument(Api());
     qx::gui::ToEngine(Api(), response, *argument.Receive());

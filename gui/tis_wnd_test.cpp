@@ -5,6 +5,7 @@
 #include <thread>
 
 #include "core/logging.h"
+#include "gui/window_messages.h"
 #include "tests/support/tis_wnd_fixture.h"
 
 namespace {
@@ -217,7 +218,20 @@ TEST_F(TisWndTest, MissingPageIsSaidAndTheWindowCloses) {
   Create();
   EXPECT_THAT(errors.Take(), ElementsAre(L"TisWnd::Init: Failed to create window from file '" + m_folder.Path() +
                                          L"\\gui\\new\\support_tool_en.html'"));
+  EXPECT_THAT(m_messages, ElementsAre(qx::kPageFailedText));
   m_window->RunMessageLoop();
   EXPECT_EQ(m_window->Handle(), nullptr);
   EXPECT_EQ(WaitForSingleObject(m_stop.Get(), 0), WAIT_OBJECT_0);
+}
+
+TEST_F(TisWndTest, PageThatIsLostIsToldAfterLoggingIsBackAndTheWindowCloses) {
+  Create();
+  Call("start_issue_reproduction", Value());
+  HtmlNotification lost{HTML_GRAPHICS_FAILURE, m_window->Handle()};
+  m_engine.callback(&lost, m_engine.callbackParam);
+  EXPECT_TRUE(m_messages.empty());  // the engine does not wait for the user
+  m_window->RunMessageLoop();
+  EXPECT_EQ(m_window->Handle(), nullptr);
+  EXPECT_THAT(m_messages, ElementsAre(qx::kPageLostText));
+  EXPECT_THAT(m_logging, ElementsAre("activate", "restore"));
 }

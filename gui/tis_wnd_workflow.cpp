@@ -184,7 +184,8 @@ void TisWnd::TisMinimize(qx::Value& message) {
 
 // Whoever waits for the event asks the window to close.
 void TisWnd::TisClose(qx::Value& message) {
-  SetSuccess(message, m_stopEvent != nullptr && SetEvent(m_stopEvent));
+  m_isClosing = m_stopEvent != nullptr && SetEvent(m_stopEvent);
+  SetSuccess(message, m_isClosing);
 }
 
 // What the page may show besides: the product, whether logging is raised, and where the package lies, if it was kept.

@@ -184,8 +184,15 @@ std::optional<Value> Window::CallPage(std::wstring_view function, std::initializ
 uint32_t CALLBACK Window::OnNotification(HtmlNotification* notification, void* param) {
   if (notification->code == HTML_LOAD_DATA) {
     static_cast<const Window*>(param)->LoadResource(*reinterpret_cast<const HtmlLoadData*>(notification));
+  } else if (notification->code == HTML_GRAPHICS_FAILURE) {
+    static_cast<Window*>(param)->PostPageLost();
   }
   return HTML_LOAD_BY_ENGINE;
+}
+
+// Not now: the engine waits for the notification's end.
+void Window::PostPageLost() {
+  m_ui.Post([this] { OnPageLost(); });
 }
 
 void Window::LoadResource(const HtmlLoadData& request) const {

@@ -41,6 +41,7 @@ class Window {
   virtual bool OnMessage(UINT message, WPARAM wparam, LPARAM lparam, LRESULT& result);
   virtual void OnDestroyed() {}
   virtual void OnLoadFailed() {}
+  virtual void OnPageLost() {}  // the page that was shown is gone for good; in the message loop
 
   // A call of the page's script; the answer becomes the call's result.
   virtual Value on_script_call(const std::wstring& name, uint32_t count, const HtmlValue* arguments);
@@ -65,6 +66,7 @@ class Window {
   void SizeAndCentre();
   SIZE PageSize() const;
   void LoadResource(const HtmlLoadData& request) const;
+  void PostPageLost();
   void RethrowFailure();
 
   const HtmlEngineApi& m_engine;

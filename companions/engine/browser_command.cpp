@@ -29,6 +29,7 @@ constexpr const wchar_t* kArguments[] = {
     L"--password-store=basic",
     L"--use-mock-keychain",
     L"--no-service-autorun",
+    L"--do-not-de-elevate",  // it would start itself anew, without the pipes and outside of the job
     L"--block-new-web-contents",
     L"--disable-gpu",
     L"--hide-scrollbars",
@@ -73,7 +74,7 @@ std::wstring BrowserCommandLine(const BrowserStart& start) {
                  L"-c",
                  ToWide(kUnixWatchScript),
                  L"st-engine-watch",
-                 path(start.profile) + L".life",
+                 path(start.mark),
                  path(start.profile)};
   }
   arguments.push_back(path(start.program));

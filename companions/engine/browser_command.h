@@ -16,6 +16,7 @@ std::wstring UnixPath(std::wstring_view path);  // without the drive, with "/"
 struct BrowserStart {
   std::wstring program;
   std::wstring profile;     // folder
+  std::wstring mark;        // file that is there as long as who started the browser
   uint64_t readHandle = 0;  // pipes that the browser inherits; 0: it opens a port
   uint64_t writeHandle = 0;
   bool hasSandbox = true;

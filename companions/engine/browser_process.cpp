@@ -18,9 +18,9 @@ namespace {
 constexpr ULONGLONG kConnectTimeout = 15000;  // milliseconds
 constexpr DWORD kPollInterval = 10;
 constexpr DWORD kEndTimeout = 3000;
-constexpr DWORD kLifeInterval = 4000;  // how often the watching shell is told that this process lives
+constexpr DWORD kTouchInterval = 4000;  // how often the watching shell is told that this process lives
 constexpr wchar_t kProfilePrefix[] = L"st-engine-";
-constexpr wchar_t kMarkSuffix[] = L".lock";
+constexpr wchar_t kMarkSuffix[] = L".life";
 constexpr DWORD kPipeSize = 1u << 20;
 
 struct AttributeListTraits {
@@ -30,9 +30,10 @@ struct AttributeListTraits {
 };
 using AttributeList = Scoped<AttributeListTraits>;
 
+// Nobody can know it before. Empty on failure.
 std::wstring RandomName() {
   unsigned char bytes[16] = {};
-  BCryptGenRandom(nullptr, bytes, sizeof bytes, BCRYPT_USE_SYSTEM_PREFERRED_RNG);
+  if (BCryptGenRandom(nullptr, bytes, sizeof bytes, BCRYPT_USE_SYSTEM_PREFERRED_RNG) != 0) return {};
   std::wstring name = kProfilePrefix;
   for (const unsigned char byte : bytes)
     name += Format(L"%02x", byte);
@@ -46,11 +47,18 @@ bool IsUnixRoot() {
   return GetUserNameW(name, &size) && std::wstring_view(name) == L"root";
 }
 
-bool Touch(const std::wstring& path) {
-  return WriteWholeFile(path, "this process lives") == ERROR_SUCCESS;
+void Touch(HANDLE file) {
+  FILETIME now{};
+  GetSystemTimeAsFileTime(&now);
+  SetFileTime(file, nullptr, nullptr, &now);
 }
 
-// Deletes the profiles of processes that were killed: those without a mark.
+// A mark whose owner lives cannot be deleted; one that a power failure left can.
+bool HasOwner(const std::wstring& mark) {
+  return PathExists(mark) && !DeleteFileW(ExtendedPath(mark).c_str());
+}
+
+// Deletes the profiles of processes that were killed. Those of Unix browsers are the watching shell's affair.
 void DeleteOrphans(const std::wstring& parent) {
   WIN32_FIND_DATAW data{};
   const FindHandle find(FindFirstFileW(ExtendedPath(parent + kProfilePrefix + L"*").c_str(), &data));
@@ -58,13 +66,13 @@ void DeleteOrphans(const std::wstring& parent) {
   do {
     const std::wstring path = parent + data.cFileName;
     const bool isFolder = (data.dwFileAttributes & FILE_ATTRIBUTE_DIRECTORY) != 0;
-    if (isFolder && !PathExists(path + kMarkSuffix)) DeleteFolder(path, true);
+    if (isFolder && !HasOwner(path + kMarkSuffix)) DeleteFolder(path, true);
   } while (FindNextFileW(find.Get(), &data));
 }
 
-KernelHandle MakeMark(const std::wstring& profile) {
-  return KernelHandle(CreateFileW(ExtendedPath(profile + kMarkSuffix).c_str(), GENERIC_WRITE | DELETE, 0, nullptr,
-                                  CREATE_NEW, FILE_FLAG_DELETE_ON_CLOSE, nullptr));
+KernelHandle MakeMark(const std::wstring& path) {
+  return KernelHandle(CreateFileW(ExtendedPath(path).c_str(), FILE_WRITE_ATTRIBUTES | DELETE, 0, nullptr, CREATE_NEW,
+                                  FILE_FLAG_DELETE_ON_CLOSE, nullptr));
 }
 
 }  // namespace
@@ -80,11 +88,20 @@ bool BrowserProcess::MakeProfile(const std::wstring& program, std::wstring& erro
   GetTempPathW(MAX_PATH + 1, temporary);
   // A Unix program needs a folder whose Unix path is known.
   const std::wstring parent = m_isUnix ? program.substr(0, 2) + L"\\tmp\\" : std::wstring(temporary);
-  m_profile = parent + RandomName();
-  if (!m_isUnix) {
-    m_profileMark = MakeMark(m_profile);  // before the folder, so that nobody takes it for an orphan
-    DeleteOrphans(parent);
+  const std::wstring name = RandomName();
+  if (name.empty()) {
+    error = L"no random name for the browser's profile";
+    return false;
   }
+  m_profile = parent + name;
+  m_mark = m_profile + kMarkSuffix;
+  m_markHandle = MakeMark(m_mark);  // before the folder, so that nobody takes it for an orphan
+  if (!m_markHandle) {
+    error = Format(L"the browser's profile cannot be marked with '%s', error %u", m_mark.c_str(), GetLastError());
+    m_profile.clear();
+    return false;
+  }
+  if (!m_isUnix) DeleteOrphans(parent);
   if (const DWORD result = CreatePrivateFolder(m_profile); result != ERROR_SUCCESS) {
     error = Format(L"the browser's profile folder '%s' cannot be made, error %u", m_profile.c_str(), result);
     m_profile.clear();
@@ -97,9 +114,10 @@ bool BrowserProcess::Start(const std::wstring& program, bool usePort, std::wstri
   m_isUnix = IsUnixProgram(program);
   m_usesPort = usePort || m_isUnix;
   m_runsWithoutSandbox = m_isUnix && IsUnixRoot();
-  if (!MakeProfile(program, error) || (m_isUnix && !BeginUnixLife(error))) return false;
+  if (!MakeProfile(program, error)) return false;
+  if (m_isUnix) BeginUnixLife();
   Pipes pipes;
-  BrowserStart start{program, m_profile, 0, 0, !m_runsWithoutSandbox};
+  BrowserStart start{program, m_profile, m_mark, 0, 0, !m_runsWithoutSandbox};
   if (!m_usesPort) {
     SECURITY_ATTRIBUTES inherited{sizeof inherited, nullptr, TRUE};
     if (!CreatePipe(m_fromBrowser.Receive(), pipes.writeEnd.Receive(), &inherited, kPipeSize) ||
@@ -115,67 +133,64 @@ bool BrowserProcess::Start(const std::wstring& program, bool usePort, std::wstri
   return CreateInJob(BrowserCommandLine(start), pipes, error);
 }
 
-bool BrowserProcess::CreateInJob(std::wstring commandLine, const Pipes& pipes, std::wstring& error) {
-  m_job.Reset(CreateJobObjectW(nullptr, nullptr));
+// Without the job a killed program would leave its browser behind.
+bool BrowserProcess::MakeJob() {
   JOBOBJECT_EXTENDED_LIMIT_INFORMATION limits{};
   limits.BasicLimitInformation.LimitFlags = JOB_OBJECT_LIMIT_KILL_ON_JOB_CLOSE;
-  SetInformationJobObject(m_job.Get(), JobObjectExtendedLimitInformation, &limits, sizeof limits);
+  m_job.Reset(CreateJobObjectW(nullptr, nullptr));
+  return m_job && SetInformationJobObject(m_job.Get(), JobObjectExtendedLimitInformation, &limits, sizeof limits);
+}
 
+bool BrowserProcess::CreateInJob(std::wstring commandLine, const Pipes& pipes, std::wstring& error) {
+  if (!MakeJob()) {
+    error = Format(L"no job for the browser, error %u", GetLastError());
+    return false;
+  }
+  // Only the pipes are inherited, whatever else of this process could be; and there is no moment outside of the job.
+  HANDLE inherited[] = {pipes.readEnd.Get(), pipes.writeEnd.Get()};
+  HANDLE jobs[] = {m_job.Get()};
+  const bool inherits = static_cast<bool>(pipes.readEnd);
+  SIZE_T size = 0;
+  InitializeProcThreadAttributeList(nullptr, 2, 0, &size);
+  std::vector<std::byte> memory(size);
   STARTUPINFOEXW startup{};
   startup.StartupInfo.cb = sizeof startup;
-  // Only the pipes are inherited, whatever else of this process could be.
-  HANDLE inherited[] = {pipes.readEnd.Get(), pipes.writeEnd.Get()};
-  SIZE_T size = 0;
-  InitializeProcThreadAttributeList(nullptr, 1, 0, &size);
-  std::vector<std::byte> memory(size);
   startup.lpAttributeList = reinterpret_cast<LPPROC_THREAD_ATTRIBUTE_LIST>(memory.data());
-  if (!InitializeProcThreadAttributeList(startup.lpAttributeList, 1, 0, &size)) {
+  if (!InitializeProcThreadAttributeList(startup.lpAttributeList, 2, 0, &size)) {
     error = Format(L"no attribute list for the browser, error %u", GetLastError());
     return false;
   }
   const AttributeList attributes(startup.lpAttributeList);
-  const bool inherits = static_cast<bool>(pipes.readEnd);
-  if (inherits) {
-    UpdateProcThreadAttribute(attributes.Get(), 0, PROC_THREAD_ATTRIBUTE_HANDLE_LIST, inherited, sizeof inherited,
-                              nullptr, nullptr);
+  const auto add = [&](DWORD_PTR attribute, HANDLE* handles, SIZE_T bytes) {
+    return UpdateProcThreadAttribute(attributes.Get(), 0, attribute, handles, bytes, nullptr, nullptr) != FALSE;
+  };
+  if ((inherits && !add(PROC_THREAD_ATTRIBUTE_HANDLE_LIST, inherited, sizeof inherited)) ||
+      (!m_isUnix && !add(PROC_THREAD_ATTRIBUTE_JOB_LIST, jobs, sizeof jobs))) {
+    error = Format(L"the browser cannot be given its pipes and its job, error %u", GetLastError());
+    return false;
   }
   PROCESS_INFORMATION process{};
-  const DWORD flags = CREATE_SUSPENDED | CREATE_NO_WINDOW | EXTENDED_STARTUPINFO_PRESENT;
-  if (!CreateProcessW(nullptr, commandLine.data(), nullptr, nullptr, inherits, flags, nullptr, nullptr,
-                      &startup.StartupInfo, &process)) {
+  if (!CreateProcessW(nullptr, commandLine.data(), nullptr, nullptr, inherits,
+                      CREATE_NO_WINDOW | EXTENDED_STARTUPINFO_PRESENT, nullptr, nullptr, &startup.StartupInfo,
+                      &process)) {
     error = Format(L"the browser cannot be started, error %u", GetLastError());
     return false;
   }
-  m_process.Reset(process.hProcess);
   const KernelHandle thread(process.hThread);
-  if (m_isUnix) return true;  // nothing of it can be held
-  // Without the job a killed program would leave its browser behind.
-  if (!AssignProcessToJobObject(m_job.Get(), m_process.Get())) {
-    error = Format(L"the browser cannot be put into a job, error %u", GetLastError());
-    TerminateProcess(m_process.Get(), 1);
-    return false;
-  }
-  ResumeThread(thread.Get());
+  m_process.Reset(process.hProcess);
   return true;
 }
 
-bool BrowserProcess::BeginUnixLife(std::wstring& error) {
-  const std::wstring life = m_profile + L".life";
+void BrowserProcess::BeginUnixLife() {
   m_lifeEnds.Reset(CreateEventW(nullptr, TRUE, FALSE, nullptr));
-  if (!m_lifeEnds || !Touch(life)) {
-    error = L"the browser's profile folder cannot be written into";
-    return false;
-  }
-  m_lifeThread = std::thread([ends = m_lifeEnds.Get(), life] {
-    while (WaitForSingleObject(ends, kLifeInterval) == WAIT_TIMEOUT)
-      Touch(life);
-    DeleteFileW(ExtendedPath(life).c_str());
+  m_lifeThread = std::thread([ends = m_lifeEnds.Get(), mark = m_markHandle.Get()] {
+    while (WaitForSingleObject(ends, kTouchInterval) == WAIT_TIMEOUT)
+      Touch(mark);
   });
-  return true;
 }
 
 bool BrowserProcess::HasEnded() const {
-  if (m_isUnix) return PathExists(m_profile + L".ended");
+  if (m_isUnix) return PathExists(m_profile + L"\\ended");
   return m_process && WaitForSingleObject(m_process.Get(), 0) == WAIT_OBJECT_0;
 }
 
@@ -204,7 +219,7 @@ std::unique_ptr<Transport> BrowserProcess::Connect(std::wstring& error) {
 
 void BrowserProcess::End() noexcept {
   if (m_lifeThread.joinable()) {
-    SetEvent(m_lifeEnds.Get());  // the shell ends the browser and deletes the profile when the file has gone
+    SetEvent(m_lifeEnds.Get());
     m_lifeThread.join();
   }
   m_fromBrowser.Reset();
@@ -212,13 +227,15 @@ void BrowserProcess::End() noexcept {
   if (m_job) TerminateJobObject(m_job.Get(), 1);
   m_job.Reset();
   if (m_process) WaitForSingleObject(m_process.Get(), kEndTimeout);
+  const bool isWatched = m_isUnix && m_process;
   m_process.Reset();
-  if (m_profile.empty() || m_isUnix) return;
+  if (isWatched) m_markHandle.Reset();  // the shell ends the browser and deletes the profile when the mark has gone
+  if (m_profile.empty() || isWatched) return;
   // Its other processes may hold files of the profile for a moment longer.
   for (const ULONGLONG start = GetTickCount64(); !DeleteFolder(m_profile, true); Sleep(kPollInterval)) {
     if (GetTickCount64() - start > kEndTimeout) break;
   }
-  m_profileMark.Reset();
+  m_markHandle.Reset();
   m_profile.clear();
 }
 

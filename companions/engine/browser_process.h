@@ -37,12 +37,14 @@ class BrowserProcess {
   struct Pipes;
 
   bool MakeProfile(const std::wstring& program, std::wstring& error);
+  bool MakeJob();
   bool CreateInJob(std::wstring commandLine, const Pipes& pipes, std::wstring& error);
-  bool BeginUnixLife(std::wstring& error);
+  void BeginUnixLife();
   std::wstring LastWords() const;
 
   std::wstring m_profile;
-  KernelHandle m_profileMark;  // "<profile>.lock", which the system deletes when this process ends
+  std::wstring m_mark;  // path, beside the profile: file that the system deletes when this process ends
+  KernelHandle m_markHandle;
   bool m_isUnix = false;
   bool m_usesPort = false;
   bool m_runsWithoutSandbox = false;

@@ -139,6 +139,15 @@ uint64_t DevToolsClient::Send(const char* method, const Json::Value& params) {
   return id;
 }
 
+void DevToolsClient::SendWatched(const char* method, const Json::Value& params) {
+  m_watched[Send(method, params)] = Clock::now();
+}
+
+std::optional<DevToolsClient::Clock::time_point> DevToolsClient::SilentSince() const {
+  if (m_watched.empty()) return {};
+  return m_watched.begin()->second;
+}
+
 DevToolsClient::Outcome DevToolsClient::Call(const char* method, const Json::Value& params, Json::Value& result,
                                              Clock::duration timeout) {
   const auto start = Clock::now();
@@ -173,6 +182,7 @@ std::optional<DevToolsMessage> DevToolsClient::Next(std::optional<Clock::time_po
 
 void DevToolsClient::Tell(DevToolsMessage message) {
   if (message.kind == DevToolsMessage::Kind::kEvent) return m_listener.onEvent(message);
+  m_watched.erase(message.id);
   const auto awaited = m_awaited.find(message.id);
   if (awaited != m_awaited.end()) {
     awaited->second = std::move(message);

@@ -38,6 +38,10 @@ class DevToolsClient {
   // Sends a command whose answer is not waited for. Never blocks.
   uint64_t Send(const char* method, const Json::Value& params = {});
 
+  // The same; SilentSince tells for how long its answer is missing.
+  void SendWatched(const char* method, const Json::Value& params);
+  std::optional<Clock::time_point> SilentSince() const;  // the oldest such command's time
+
   // Sends a command and waits for its answer. Events that come meanwhile are told, which may lead to nested calls.
   Outcome Call(const char* method, const Json::Value& params, Json::Value& result, Clock::duration timeout);
 
@@ -64,6 +68,7 @@ class DevToolsClient {
   uint64_t m_lastId = 0;
   Clock::time_point m_lastLife;
   std::map<uint64_t, std::optional<DevToolsMessage>> m_awaited;
+  std::map<uint64_t, Clock::time_point> m_watched;
 };
 
 }  // namespace engine

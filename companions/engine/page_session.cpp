@@ -10,6 +10,7 @@
 #include "companions/engine/value_json.h"
 #include "core/files.h"
 #include "core/json.h"
+#include "core/scope_exit.h"
 #include "core/text.h"
 
 namespace engine {
@@ -19,6 +20,7 @@ using Clock = DevToolsClient::Clock;
 using Outcome = DevToolsClient::Outcome;
 
 constexpr uint64_t kLargestResource = uint64_t{32} << 20;
+constexpr int kMostDepartures = 3;  // a page that goes away each time it is loaded would do nothing else
 
 Json::Value With(const char* name, Json::Value value) {
   Json::Value object(Json::objectValue);
@@ -85,10 +87,10 @@ bool PageSession::Load(const std::wstring& address) {
   Json::Value result;
   Outcome outcome = m_client->Call("Page.navigate", With("url", page->browserUrl), result, m_timeouts.load);
   const std::string error = TextOf(result, "errorText");
-  m_mainFrame = TextOf(result, "frameId");
   if (outcome == Outcome::kDone && error.empty()) {
     while (!m_isLoaded && m_client->Drain(deadline)) {
     }
+    m_isShown = m_isShown || m_isLoaded;
     if (m_isLoaded) return true;
     outcome = IsLost() ? Outcome::kLost : Outcome::kTimedOut;
   }
@@ -118,18 +120,29 @@ void PageSession::SetFocus(bool hasFocus) {
 }
 
 void PageSession::SendInput(const char* method, const Json::Value& params) {
-  if (m_client != nullptr) m_client->Send(method, params);
+  if (m_client == nullptr) return;
+  // While the page waits for native code it can take nothing.
+  const auto silentSince = m_waiting.empty() ? m_client->SilentSince() : std::nullopt;
+  if (silentSince && Clock::now() - *silentSince > m_timeouts.input) return GiveUp(L"the page hangs");
+  m_client->SendWatched(method, params);
+}
+
+void PageSession::GiveUp(const std::wstring& why) {
+  if (!std::exchange(m_isLossReported, true)) Complain(why);
+  m_client->Close();
 }
 
 void PageSession::Drain() {
   if (m_client == nullptr) return;
   ReleaseFunctionsOfPage();
   m_client->Drain();
-  if (IsLost() && !std::exchange(m_isLossReported, true)) Complain(L"the browser is gone: " + m_client->LostBecause());
+  if (!IsLost() || std::exchange(m_isLossTold, true)) return;
+  if (!m_isLossReported) Complain(L"the browser is gone: " + m_client->LostBecause());
+  if (m_isShown) m_host.PageLost();
 }
 
 void PageSession::End() {
-  m_isLossReported = true;
+  m_isLossTold = true;
   if (m_client == nullptr) return;
   m_client->Send("Browser.close");
   m_client->Close();
@@ -153,11 +166,21 @@ void PageSession::OnEvent(const DevToolsMessage& event) {
     m_host.Report(HTML_SUBSYSTEM_SCRIPT, HTML_WARNING, L"a dialog was not shown: " + ToWide(TextOf(params, "message")));
     m_client->Send("Page.handleJavaScriptDialog", With("accept", TextOf(params, "type") == "alert"));
   } else if (event.method == "Inspector.targetCrashed" || event.method == "Inspector.detached") {
-    if (!std::exchange(m_isLossReported, true)) Complain(L"the page has crashed");
-    m_client->Close();
+    GiveUp(L"the page has crashed");
+  } else if (event.method == "Page.frameNavigated") {
+    OnNavigated(MemberOf(params, "frame"));
   } else if (const auto message = ReadConsoleMessage(event)) {
     m_host.Report(message->subsystem, message->severity, message->text);
   }
+}
+
+// Only what needs no request gets here: "about:blank", a blob. All else was refused before.
+void PageSession::OnNavigated(const Json::Value& frame) {
+  const std::string url = TextOf(frame, "url");
+  if (!m_isShown || frame.isMember("parentId") || ToEngineUri(url)) return;
+  if (++m_departures > kMostDepartures) return GiveUp(L"the page does not stay");
+  Complain(L"the page went to '" + ToWide(url) + L"'; it is loaded again");
+  m_client->Send("Page.navigate", With("url", m_page.browserUrl));
 }
 
 void PageSession::OnFrame(const Json::Value& params) {
@@ -180,13 +203,14 @@ void PageSession::OnRequest(const Json::Value& params) {
   }
   // Every browser asks for an icon of the site, which no page here has.
   if (IsSiteIcon(url)) return Answer(requestId, "image/x-icon", {});
-  if (const auto uri = ToEngineUri(url)) return Supply(requestId, *uri);
-  m_host.Report(HTML_SUBSYSTEM_DOM, HTML_ERROR, L"refused, because it lies outside of the page: " + ToWide(url));
   // A page that wants to go elsewhere stays where it is.
-  Refuse(requestId, TextOf(params, "resourceType") == "Document" ? "Aborted" : "BlockedByClient");
+  const char* const refusal = TextOf(params, "resourceType") == "Document" ? "Aborted" : "BlockedByClient";
+  if (const auto uri = ToEngineUri(url)) return Supply(requestId, *uri, refusal);
+  m_host.Report(HTML_SUBSYSTEM_DOM, HTML_ERROR, L"refused, because it lies outside of the page: " + ToWide(url));
+  Refuse(requestId, refusal);
 }
 
-void PageSession::Supply(const std::string& requestId, const std::wstring& uri) {
+void PageSession::Supply(const std::string& requestId, const std::wstring& uri, const char* refusal) {
   bool isDiscarded = false;
   const auto bytes = LoadResource(uri, isDiscarded);
   m_host.DataLoaded(uri, bytes ? &*bytes : nullptr);
@@ -198,7 +222,7 @@ void PageSession::Supply(const std::string& requestId, const std::wstring& uri) 
   if (!isDiscarded) {
     m_host.Report(HTML_SUBSYSTEM_DOM, HTML_ERROR, L"cannot be loaded: " + uri);
   }
-  Refuse(requestId, isDiscarded ? "Aborted" : "AddressUnreachable");
+  Refuse(requestId, isDiscarded ? "Aborted" : refusal);
 }
 
 std::optional<std::string> PageSession::LoadResource(const std::wstring& uri, bool& isDiscarded) {
@@ -249,28 +273,37 @@ void PageSession::OnNativeCall(const std::string& requestId, const Json::Value& 
     return;
   }
   const auto self = shared_from_this();  // native code may close the window
+  const auto call = std::make_shared<WaitingCall>();
+  call->requestId = requestId;
+  Json::Value reply;
+  try {
+    reply = ReplyTo(message, call);
+  } catch (const std::exception& exception) {  // no memory; without an answer the page would wait for ever
+    reply = With("error", "native code has failed");
+    Complain(L"a call of the page has failed: " + ToWide(exception.what()));
+  }
+  if (!call->requestId.empty()) Answer(call->requestId, "application/json", WriteCompactJson(reply));
+}
+
+Json::Value PageSession::ReplyTo(const Json::Value& message, const std::shared_ptr<WaitingCall>& call) {
   std::vector<ScriptValue> arguments;
   for (const Json::Value& argument : MemberOf(message, "args"))
     arguments.push_back(FromWire(argument, weak_from_this()));
   const std::string name = TextOf(message, "call");
-  const auto call = std::make_shared<WaitingCall>();
-  call->requestId = requestId;
-  m_waiting.push_back(call);
   ScriptValue result;
-  const bool isHandled = m_host.ScriptCall(name, arguments, result);
-  m_waiting.pop_back();
-  m_client->NoteLife();
-  const Text* error = result.As<Text>();
-  Json::Value reply(Json::objectValue);
-  if (!isHandled) {
-    reply["error"] = "there is no native function '" + name + "'";
-    m_host.Report(HTML_SUBSYSTEM_SCRIPT, HTML_ERROR, L"the page calls '" + ToWide(name) + L"', which nobody handles");
-  } else if (error != nullptr && error->isError) {
-    reply["error"] = ToUtf8(error->text);
-  } else {
-    reply["value"] = ToWire(result);
+  bool isHandled = false;
+  {
+    m_waiting.push_back(call);
+    const ScopeExit end([this] { m_waiting.pop_back(); });
+    isHandled = m_host.ScriptCall(name, arguments, result);
   }
-  if (!call->requestId.empty()) Answer(call->requestId, "application/json", WriteCompactJson(reply));
+  m_client->NoteLife();
+  if (!isHandled) {
+    m_host.Report(HTML_SUBSYSTEM_SCRIPT, HTML_ERROR, L"the page calls '" + ToWide(name) + L"', which nobody handles");
+    return With("error", "there is no native function '" + name + "'");
+  }
+  const Text* error = result.As<Text>();
+  return error != nullptr && error->isError ? With("error", ToUtf8(error->text)) : With("value", ToWire(result));
 }
 
 bool PageSession::CallByName(const std::string& name, const std::vector<ScriptValue>& arguments, ScriptValue& result) {
@@ -282,7 +315,10 @@ bool PageSession::CallOwn(const char* function, const std::vector<ScriptValue>& 
 }
 
 bool PageSession::CallFunction(uint64_t id, const std::vector<ScriptValue>& arguments, ScriptValue& result) {
-  return RunInPage(With("id", Json::UInt64{id}), arguments, result);
+  const auto host = m_hostLife.lock();
+  if (host != nullptr) return RunInPage(With("id", Json::UInt64{id}), arguments, result);
+  result = ScriptValue::Error(L"there is no page");
+  return false;
 }
 
 bool PageSession::RunInPage(Json::Value job, const std::vector<ScriptValue>& arguments, ScriptValue& result) {

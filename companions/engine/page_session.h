@@ -34,6 +34,7 @@ class PageHost {
   virtual void Report(HtmlSubsystem subsystem, HtmlSeverity severity, const std::wstring& text) = 0;
   virtual void ShowFrame(const std::string& base64) = 0;  // PNG
   virtual void OnNotice(const Json::Value& notice) = 0;   // page_bridge.js says which there are
+  virtual void PageLost() = 0;                            // the page that was shown is gone for good, or hangs
 };
 
 // How long the browser may take.
@@ -42,13 +43,15 @@ struct PageTimeouts {
   std::chrono::milliseconds load{15000};
   std::chrono::milliseconds script{15000};     // a call into the page
   std::chrono::milliseconds slowScript{1000};  // the same, after one that was not answered
+  std::chrono::milliseconds input{15000};      // to take what the user does, until it is given up
 };
 
 class PageSession : public FunctionHome, public std::enable_shared_from_this<PageSession> {
  public:
-  // `wake` is called on any thread when Drain has something to do.
-  PageSession(PageHost& host, std::function<void()> wake, PageTimeouts timeouts = {})
-      : m_host(host), m_wake(std::move(wake)), m_timeouts(timeouts) {}
+  // `wake` is called on any thread when Drain has something to do. The host calls the session only while it lives
+  // itself; CallFunction, which others call, does nothing when the host is gone.
+  PageSession(const std::shared_ptr<PageHost>& host, std::function<void()> wake, PageTimeouts timeouts = {})
+      : m_hostLife(host), m_host(*host), m_wake(std::move(wake)), m_timeouts(timeouts) {}
 
   // Takes the browser's page over. False after a report.
   bool Begin(std::unique_ptr<Transport> transport);
@@ -81,8 +84,11 @@ class PageSession : public FunctionHome, public std::enable_shared_from_this<Pag
   void OnEvent(const DevToolsMessage& event);
   void OnRequest(const Json::Value& params);
   void OnNativeCall(const std::string& requestId, const Json::Value& message);
+  Json::Value ReplyTo(const Json::Value& message, const std::shared_ptr<WaitingCall>& call);
   void OnFrame(const Json::Value& params);
-  void Supply(const std::string& requestId, const std::wstring& uri);
+  void OnNavigated(const Json::Value& frame);
+  void GiveUp(const std::wstring& why);
+  void Supply(const std::string& requestId, const std::wstring& uri, const char* refusal);
   std::optional<std::string> LoadResource(const std::wstring& uri, bool& isDiscarded);
   void Answer(const std::string& requestId, std::string_view type, const std::string& body);
   void Refuse(const std::string& requestId, const char* reason);
@@ -92,14 +98,17 @@ class PageSession : public FunctionHome, public std::enable_shared_from_this<Pag
   void ReleaseFunctionsOfPage();
   void Complain(const std::wstring& text);
 
+  const std::weak_ptr<PageHost> m_hostLife;
   PageHost& m_host;
   const std::function<void()> m_wake;
   const PageTimeouts m_timeouts;
   std::unique_ptr<DevToolsClient> m_client;
   PageAddress m_page;
-  std::string m_mainFrame;
   bool m_isLoaded = false;
+  bool m_isShown = false;  // the page was loaded once
+  int m_departures = 0;    // how often it went to where nothing of the program is
   bool m_isLossReported = false;
+  bool m_isLossTold = false;
   bool m_isSlow = false;  // the page let a call time out and has answered none since
   std::vector<std::shared_ptr<WaitingCall>> m_waiting;
   std::mutex m_releaseLock;

@@ -15,21 +15,29 @@ namespace {
 using testing::HasSubstr;
 
 constexpr PageTimeouts kShort{std::chrono::milliseconds(1000), std::chrono::milliseconds(1000),
-                              std::chrono::milliseconds(1000), std::chrono::milliseconds(100)};
+                              std::chrono::milliseconds(1000), std::chrono::milliseconds(100),
+                              std::chrono::milliseconds(1500)};
 
 class RecordingHost : public PageHost {
  public:
   Supply LoadData(const std::wstring&) override { return {}; }
   void DataLoaded(const std::wstring&, const std::string*) override {}
-  bool ScriptCall(const std::string&, const std::vector<ScriptValue>&, ScriptValue&) override { return false; }
+  bool ScriptCall(const std::string& name, const std::vector<ScriptValue>&, ScriptValue&) override {
+    if (name == "throw") throw std::bad_alloc();
+    if (onCall) onCall();
+    return false;
+  }
   void Report(HtmlSubsystem, HtmlSeverity severity, const std::wstring& text) override {
     if (severity == HTML_ERROR) reports += ToUtf8(text) + "\n";
   }
   void ShowFrame(const std::string& base64) override { frames += base64; }
   void OnNotice(const Json::Value&) override {}
+  void PageLost() override { ++losses; }
 
   std::string reports;
   std::string frames;
+  int losses = 0;
+  std::function<void()> onCall;
 };
 
 class PageSessionTest : public testing::Test {
@@ -37,7 +45,7 @@ class PageSessionTest : public testing::Test {
   PageSessionTest() {
     SetEnvironmentVariableW(L"TMP", m_folder.MakeFolder(L"tmp").c_str());
     m_session = std::make_shared<PageSession>(
-        m_host, [] {}, kShort);
+        m_hostOwner, [] {}, kShort);
   }
   ~PageSessionTest() override {
     m_session->End();
@@ -64,7 +72,8 @@ class PageSessionTest : public testing::Test {
   }
 
   const TestFolder m_folder;
-  RecordingHost m_host;
+  std::shared_ptr<RecordingHost> m_hostOwner = std::make_shared<RecordingHost>();
+  RecordingHost& m_host = *m_hostOwner;
   BrowserProcess m_browser;
   std::shared_ptr<PageSession> m_session;
   ScriptValue m_result;
@@ -87,7 +96,7 @@ TEST_F(PageSessionTest, ABrowserThatIsNoneIsGivenUpWithAReason) {
     PageTimeouts timeouts = kShort;
     if (one.manner != std::wstring(L"silent")) timeouts.command = std::chrono::seconds(30);
     const auto wake = [] {};
-    m_session = std::make_shared<PageSession>(m_host, wake, timeouts);
+    m_session = std::make_shared<PageSession>(m_hostOwner, wake, timeouts);
     EXPECT_FALSE(BeginWith(one.manner)) << one.reason;
     EXPECT_THAT(m_host.reports, HasSubstr(one.reason));
     EXPECT_FALSE(m_session->Load(L"res:page.htm"));
@@ -122,6 +131,7 @@ TEST_F(PageSessionTest, ABrowserThatDiesInACallEndsTheCall) {
   EXPECT_TRUE(m_session->IsLost());
   m_session->Drain();
   EXPECT_THAT(m_host.reports, HasSubstr("the browser is gone: the browser's pipe has ended"));
+  EXPECT_EQ(m_host.losses, 0);  // nothing had been shown
   EXPECT_FALSE(m_session->CallByName("f", {}, m_result));
   EXPECT_FALSE(m_session->Load(L"res:page.htm"));
 }
@@ -134,6 +144,63 @@ TEST_F(PageSessionTest, APageThatHangsIsWaitedForOnceAndThenOnlyShortly) {
   EXPECT_FALSE(m_session->CallByName("pleaseHang", {}, m_result));
   EXPECT_LT(std::chrono::steady_clock::now() - start, std::chrono::milliseconds(900));
   EXPECT_TRUE(m_session->CallByName("f", {}, m_result));
+}
+
+TEST_F(PageSessionTest, AShownPageThatIsLostIsToldOnce) {
+  ASSERT_TRUE(BeginWith(L"good"));
+  ASSERT_TRUE(m_session->Load(L"res:page.htm"));
+  EXPECT_FALSE(m_session->CallByName("pleaseDie", {}, m_result));
+  m_session->Drain();
+  m_session->Drain();
+  EXPECT_EQ(m_host.losses, 1);
+}
+
+TEST_F(PageSessionTest, APageThatTakesNoInputIsGivenUp) {
+  ASSERT_TRUE(BeginWith(L"good"));
+  ASSERT_TRUE(m_session->Load(L"res:page.htm"));
+  for (const char* method : {"Input.taken", "Input.pleaseHang"}) {
+    m_session->SendInput(method, {});
+    Sleep(2000);
+    m_session->Drain();
+    EXPECT_FALSE(m_session->IsLost());
+  }
+  m_session->SendInput("Input.taken", {});
+  m_session->Drain();
+  EXPECT_THAT(m_host.reports, HasSubstr("the page hangs"));
+  EXPECT_EQ(m_host.losses, 1);
+}
+
+TEST_F(PageSessionTest, APageThatGoesAwayIsFetchedBackThreeTimes) {
+  ASSERT_TRUE(BeginWith(L"good"));
+  ASSERT_TRUE(m_session->Load(L"res:leaving.htm"));
+  for (int i = 0; i < 200 && m_host.losses == 0; ++i) {
+    Sleep(10);
+    m_session->Drain();
+  }
+  EXPECT_EQ(m_host.losses, 1);
+  EXPECT_THAT(m_host.reports, HasSubstr("the page went to 'about:blank'; it is loaded again"));
+  EXPECT_THAT(m_host.reports, HasSubstr("the page does not stay"));
+}
+
+TEST_F(PageSessionTest, ACallThatFailsIsAnsweredAllTheSame) {
+  ASSERT_TRUE(BeginWith(L"good"));
+  ASSERT_TRUE(m_session->Load(L"res:page.htm"));
+  // The page function "calls" ends when native code has answered the call that it makes.
+  EXPECT_TRUE(m_session->CallByName("calls_throw", {}, m_result));
+  EXPECT_THAT(m_host.reports, HasSubstr("a call of the page has failed"));
+  EXPECT_TRUE(m_session->CallByName("calls_throw", {}, m_result));
+}
+
+TEST_F(PageSessionTest, AHostMayGoInACallOfAFunction) {
+  ASSERT_TRUE(BeginWith(L"good"));
+  m_host.onCall = [this] {
+    m_session->End();
+    m_hostOwner.reset();
+  };
+  const auto self = m_session;
+  EXPECT_FALSE(self->CallFunction(7, {}, m_result));
+  EXPECT_EQ(m_hostOwner, nullptr);
+  EXPECT_FALSE(self->CallFunction(7, {}, m_result));
 }
 
 TEST_F(PageSessionTest, TheBrowserEndsWithItsOwnerWithinAMoment) {

@@ -81,7 +81,7 @@ TEST(BrowserCommand, ArgumentsAreQuotedAsProgramsReadThem) {
 
 TEST(BrowserCommand, AWindowsBrowserGetsPipesAndKeepsItsSandbox) {
   const std::wstring line =
-      BrowserCommandLine({L"C:\\Program Files\\b\\msedge.exe", L"C:\\Temp\\profile", 0x10, 0x14, true});
+      BrowserCommandLine({L"C:\\Program Files\\b\\msedge.exe", L"C:\\Temp\\profile", L"", 0x10, 0x14, true});
   EXPECT_TRUE(line.starts_with(L"\"C:\\Program Files\\b\\msedge.exe\" --headless "));
   EXPECT_NE(line.find(L" --remote-debugging-pipe --remote-debugging-io-pipes=16,20 "), std::wstring::npos);
   EXPECT_NE(line.find(L" --user-data-dir=C:\\Temp\\profile "), std::wstring::npos);
@@ -90,7 +90,8 @@ TEST(BrowserCommand, AWindowsBrowserGetsPipesAndKeepsItsSandbox) {
 }
 
 TEST(BrowserCommand, AUnixBrowserGetsUnixPathsAndAWatch) {
-  const std::wstring line = BrowserCommandLine({L"Z:\\usr\\bin\\chromium", L"Z:\\tmp\\profile", 0, 0, false});
+  const std::wstring line =
+      BrowserCommandLine({L"Z:\\usr\\bin\\chromium", L"Z:\\tmp\\profile", L"Z:\\tmp\\profile.life", 0, 0, false});
   EXPECT_TRUE(line.starts_with(L"Z:\\bin\\sh -c "));
   EXPECT_NE(line.find(L" /tmp/profile.life /tmp/profile /usr/bin/chromium --headless "), std::wstring::npos);
   EXPECT_NE(line.find(L" --user-data-dir=/tmp/profile "), std::wstring::npos);

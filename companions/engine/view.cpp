@@ -38,6 +38,15 @@ Views& AllViews() {
   return s_views;
 }
 
+bool HasElevatedRights() {
+  KernelHandle token;
+  TOKEN_ELEVATION elevation{};
+  DWORD size = 0;
+  return !OpenProcessToken(GetCurrentProcess(), TOKEN_QUERY, token.Receive()) ||
+         !GetTokenInformation(token.Get(), TokenElevation, &elevation, sizeof elevation, &size) ||
+         elevation.TokenIsElevated != 0;
+}
+
 UINT WakeMessage() {
   static const UINT s_message = RegisterWindowMessageW(L"st-engine-wake");
   return s_message;
@@ -99,12 +108,17 @@ bool View::ConnectBrowser() {
     if (m_browser.RunsWithoutSandbox()) {
       Report(HTML_SUBSYSTEM_DOM, HTML_WARNING, L"the browser runs without its sandbox, because the user is root");
     }
-    const auto session =
-        std::make_shared<PageSession>(*this, [window = m_window] { PostMessageW(window, WakeMessage(), 0, 0); });
+    const auto session = std::make_shared<PageSession>(
+        shared_from_this(), [window = m_window] { PostMessageW(window, WakeMessage(), 0, 0); });
     m_session = session;
     if (session->Begin(std::move(transport))) return true;
     session->End();
     if (m_browser.UsesPort() || m_isDestroyed) return false;
+    // Whoever speaks with a browser's port has the browser's rights.
+    if (HasElevatedRights()) {
+      Report(HTML_SUBSYSTEM_DOM, HTML_ERROR, L"the browser takes no pipes, and a port would lend others these rights");
+      return false;
+    }
     Report(HTML_SUBSYSTEM_DOM, HTML_WARNING, L"the browser takes no pipes; it is started again with a port");
     m_browser.End();
     m_session = nullptr;
@@ -124,10 +138,21 @@ void View::Destroy() {
   const auto session = m_session;  // stays for calls that are on their way
   if (session != nullptr) session->End();
   m_browser.End();
-  if (m_host != nullptr) {
-    HtmlNotification notification{HTML_ENGINE_DESTROYED, m_window};
-    m_host(&notification, m_hostParam);
-  }
+  NotifyHost(HTML_ENGINE_DESTROYED);
+  // It was the last: calls that are still on their way tell nobody any more.
+  m_host = nullptr;
+  m_debugOutput = nullptr;
+  m_eventHandlers.clear();
+}
+
+void View::NotifyHost(HtmlNotificationCode code) {
+  if (m_host == nullptr) return;
+  HtmlNotification notification{static_cast<uint32_t>(code), m_window};
+  m_host(&notification, m_hostParam);
+}
+
+void View::PageLost() {
+  NotifyHost(HTML_GRAPHICS_FAILURE);
 }
 
 // --- The host's callbacks

@@ -54,6 +54,7 @@ class View : public PageHost, public std::enable_shared_from_this<View> {
   void Report(HtmlSubsystem subsystem, HtmlSeverity severity, const std::wstring& text) override;
   void ShowFrame(const std::string& base64) override;
   void OnNotice(const Json::Value& notice) override;
+  void PageLost() override;
 
  private:
   struct EventHandler {
@@ -64,6 +65,7 @@ class View : public PageHost, public std::enable_shared_from_this<View> {
   void StartBrowser(bool usePort);
   bool ConnectBrowser();
   void Destroy();
+  void NotifyHost(HtmlNotificationCode code);
   bool IsLayered() const;
   SIZE ClientSize() const;
   double Scale() const;

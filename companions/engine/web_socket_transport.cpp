@@ -19,6 +19,14 @@ struct InternetHandleTraits {
 };
 using InternetHandle = Scoped<InternetHandleTraits>;
 
+DWORD StatusOf(HINTERNET request) {
+  DWORD status = 0;
+  DWORD size = sizeof status;
+  WinHttpQueryHeaders(request, WINHTTP_QUERY_STATUS_CODE | WINHTTP_QUERY_FLAG_NUMBER, WINHTTP_HEADER_NAME_BY_INDEX,
+                      &status, &size, WINHTTP_NO_HEADER_INDEX);
+  return status;
+}
+
 class WebSocketTransport : public Transport {
  public:
   bool Connect(const DevToolsAddress& address, std::wstring& error) {
@@ -36,8 +44,11 @@ class WebSocketTransport : public Transport {
       error = Format(L"the browser's port %u does not answer, error %u", address.port, GetLastError());
       return false;
     }
-    m_socket.Reset(WinHttpWebSocketCompleteUpgrade(request.Get(), 0));
-    if (!m_socket) error = Format(L"the browser's port refuses a web socket, error %u", GetLastError());
+    const DWORD status = StatusOf(request.Get());
+    if (status == HTTP_STATUS_SWITCH_PROTOCOLS) m_socket.Reset(WinHttpWebSocketCompleteUpgrade(request.Get(), 0));
+    if (!m_socket) {
+      error = Format(L"the browser's port refuses a web socket, status %u, error %u", status, GetLastError());
+    }
     return static_cast<bool>(m_socket);
   }
 

@@ -1,7 +1,7 @@
 // A window on the engine's table, as small as a host can be. It says on its standard output what happens, one line
 // each, and does what the lines of its standard input tell it.
 //
-//   engine_host.exe LIBRARY PAGE [--browser PATH] [--size W H] [--plain]
+//   engine_host.exe LIBRARY PAGE [--browser PATH] [--size W H] [--plain] [--temporary FOLDER]
 //
 // Commands: call NAME JSON-ARRAY    post MESSAGE WPARAM LPARAM    pixel X Y    size W H    measure    abort    close
 // Native functions for the page: echo(value), kind(value), print(text), invoke(function, value) and later(function,
@@ -253,6 +253,8 @@ Arguments ReadArguments(int argc, wchar_t** argv) {
     } else if (word == L"--size" && i + 2 < argc) {
       arguments.width = _wtoi(argv[++i]);
       arguments.height = _wtoi(argv[++i]);
+    } else if (word == L"--temporary" && i + 1 < argc) {
+      SetEnvironmentVariableW(L"TMP", argv[++i]);
     } else if (word == L"--plain") {
       arguments.isLayered = false;
     } else {

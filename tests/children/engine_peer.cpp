@@ -56,15 +56,31 @@ std::string ResultOf(const std::string& command) {
   return "{}";
 }
 
+// A page function that calls native code, and returns when it has the answer.
+void CallNative(const Pipes& pipes, const std::string& name) {
+  Send(pipes, R"({"method":"Fetch.requestPaused","params":{"requestId":"call","request":{"url":)"
+              R"("https://res.engine.invalid/.native-call","postData":"{\"call\":\")" +
+                  name + R"(\",\"args\":[]}"}}})");
+  while (!Has(Receive(pipes), "Fetch.fulfillRequest")) {
+  }
+}
+
 void Answer(const Pipes& pipes, const std::string& command) {
   if (Has(command, "pleaseDie")) std::exit(0);
   if (Has(command, "pleaseHang")) return;
+  if (Has(command, "calls_throw")) CallNative(pipes, "throw");
+  if (Has(command, "\\\"id\\\":7")) CallNative(pipes, "any");
   Send(pipes, "{\"id\":" + IdOf(command) + ",\"result\":" + ResultOf(command) + "}");
   if (Has(command, "Page.navigate")) {
     Send(pipes, "this is no message");
     Send(pipes, R"({"id":999999,"result":{}})");
     Send(pipes, R"({"method":"Fetch.requestPaused","params":{"requestId":7,"request":"nonsense"}})");
     Send(pipes, R"({"method":"Page.screencastFrame","params":{"data":"!!!","sessionId":1}})");
+    if (Has(command, "leaving.htm")) {
+      Send(pipes, R"({"method":"Page.frameNavigated","params":{"frame":{"id":"I","parentId":"F","url":"data:,"}}})");
+      Send(pipes, R"({"method":"Page.loadEventFired","params":{}})");
+      Send(pipes, R"({"method":"Page.frameNavigated","params":{"frame":{"id":"F","url":"about:blank"}}})");
+    }
     if (!Has(command, "never.htm")) Send(pipes, R"({"method":"Page.loadEventFired","params":{}})");
   }
 }

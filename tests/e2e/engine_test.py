@@ -1,9 +1,8 @@
 """The engine (sciter.dll) with a real browser on a virtual screen: engine_host.exe is the window."""
-import glob
+import json
 import os
 import pathlib
 import shutil
-import signal
 import subprocess
 import sys
 import tempfile
@@ -11,11 +10,13 @@ import time
 import unittest
 
 sys.path.insert(0, str(pathlib.Path(__file__).resolve().parents[1] / "support"))
-from browsers import browser_processes, processor_seconds  # noqa: E402
+from browser_traces import BrowserTraces, processor_seconds  # noqa: E402
 from engine_host import EngineHost, windows_path  # noqa: E402
+from page_probe import PageProbe  # noqa: E402
 from x_session import XSession  # noqa: E402
 
 SOURCE = pathlib.Path(__file__).resolve().parents[2]
+SUPPORT = SOURCE / "tests/support"
 BIN = pathlib.Path(os.environ.get("ST_BIN", SOURCE / "build/windows-cross/bin"))
 
 WM_LBUTTONDOWN, WM_LBUTTONUP, WM_MOUSEWHEEL, WM_CHAR = 0x201, 0x202, 0x20A, 0x102
@@ -38,8 +39,44 @@ def at(x, y):
     return y << 16 | x
 
 
-def profiles():
-    return glob.glob("/tmp/st-engine-*")
+class UnixWatchTest(unittest.TestCase):
+    """The shell that watches a Unix browser, with `sleep` as the browser."""
+
+    def test_browser_and_profile_go_with_the_mark(self):
+        with tempfile.TemporaryDirectory(prefix="st_watch_") as folder:
+            (pathlib.Path(folder) / "st-engine-orphan").mkdir()
+            watches = {}
+            for name in ("kept", "deleted", "aged", "slept"):
+                profile = pathlib.Path(folder) / f"st-engine-{name}"
+                profile.mkdir()
+                mark = pathlib.Path(f"{profile}.life")
+                mark.touch()
+                watches[name] = (profile, mark, subprocess.Popen(
+                    ["sh", "-c", (SOURCE / "companions/engine/unix_watch.sh").read_text(), "watch", mark, profile, "sleep", "60"]))
+            try:
+                self.look_after(watches)
+            finally:
+                for profile, mark, watch in watches.values():
+                    mark.unlink(missing_ok=True)
+                    self.assertEqual(watch.wait(10), 0)
+                    self.assertFalse(profile.exists())
+
+    def look_after(self, watches):
+        time.sleep(0.5)
+        watches["deleted"][1].unlink()
+        for name in ("aged", "slept"):
+            os.utime(watches[name][1], (0, 0))
+        time.sleep(2.5)
+        self.assertFalse(watches["deleted"][0].exists())
+        watches["slept"][1].touch()  # its owner is awake again
+        deadline = time.monotonic() + 15
+        while watches["aged"][0].exists() or watches["aged"][1].exists():
+            self.assertLess(time.monotonic(), deadline)
+            time.sleep(0.1)
+        self.assertFalse((watches["kept"][0].parent / "st-engine-orphan").exists())
+        self.assertTrue(watches["kept"][0].exists() and watches["slept"][0].exists())
+        for name in ("kept", "slept"):
+            self.assertIsNone(watches[name][2].poll())
 
 
 class EngineTest(unittest.TestCase):
@@ -48,6 +85,8 @@ class EngineTest(unittest.TestCase):
         cls.session = XSession()
         cls.session.__enter__()
         cls.addClassCleanup(cls.session.__exit__)
+        cls.traces = BrowserTraces(cls.session)
+        cls.addClassCleanup(cls.traces.kill)
 
     def setUp(self):
         self._folder = tempfile.TemporaryDirectory(prefix="st_engine_test_")
@@ -55,15 +94,6 @@ class EngineTest(unittest.TestCase):
         self.folder = pathlib.Path(self._folder.name) / "pages 100%"
         self.folder.mkdir()
         (self.folder / "own.css").write_text("p { color: rgb(1, 2, 3) }")
-
-    def browsers(self):
-        return browser_processes(self.session)
-
-    def gone_within(self, seconds):
-        deadline = time.monotonic() + seconds
-        while time.monotonic() < deadline and (self.browsers() or profiles()):
-            time.sleep(0.2)
-        return not self.browsers() and not profiles()
 
     def open(self, script, *arguments, page=PAGE):
         (self.folder / "index.htm").write_text(page.replace("SCRIPT", script), encoding="utf-8")
@@ -215,21 +245,49 @@ class EngineTest(unittest.TestCase):
         self.assertEqual(host.ask("call ask []", "called"), '1 "false"')
         time.sleep(0.5)
         self.assertEqual(host.ask("call ask []", "called"), '1 "false"')
+        # Other ways to leave, by what no request is made for, and by pages that are not there.
+        for way in ("location.href = 'about:blank'", "location.href = 'missing.htm'", "history.back()",
+                    "location.href = URL.createObjectURL(new Blob(['x'], {type: 'text/html'}))"):
+            host.send(f"call leave {json.dumps(['javascript:void(' + way + ')'])}")
+            host.wait_for("called")
+            deadline = time.monotonic() + 10
+            while host.ask("call ask []", "called") != '1 "false"':
+                self.assertLess(time.monotonic(), deadline, way)
+                time.sleep(0.1)
         text = "\n".join(host.lines)
-        for report in ("outside of the page: https://example.com/", "a page cannot open windows", "a dialog was not shown"):
+        for report in ("outside of the page: https://example.com/", "a page cannot open windows", "a dialog was not shown",
+                       "the page went to 'about:blank'; it is loaded again", "missing.htm"):
             self.assertIn(report, text)
+
+    def test_page_cannot_have_other_windows(self):
+        host = self.open("""
+            function byLink() { const a = document.createElement('a'); a.href = 'index.htm'; a.target = '_blank';
+                                document.body.append(a); a.click(); }
+            function byFrame() { const f = document.createElement('iframe'); document.body.append(f);
+                                 return String(f.contentWindow.open('index.htm')); }
+            function byForm() { const f = document.createElement('form'); f.target = 'other'; document.body.append(f);
+                                f.submit(); }""")
+        host.wait_for("shown")
+        with PageProbe(self.traces.profile()) as probe:
+            for way in ("byLink", "byFrame", "byForm"):
+                host.ask(f"call {way} []", "called")
+                time.sleep(0.3)
+                self.assertEqual(len(probe.pages()), 1, way)
 
     def test_closing_ends_the_browser_and_deletes_its_profile(self):
         host = self.open("")
         host.wait_for("shown")
-        self.assertTrue(self.browsers() and profiles())
+        self.assertTrue(self.traces.left())
         host.send("close")
         host.wait_for("engine destroyed")
         self.assertEqual(host.wait(), 0)
-        self.assertTrue(self.gone_within(6), (self.browsers(), profiles()))
+        self.traces.seconds_until_gone(6)
 
     def test_page_may_close_its_window_in_a_call(self):
         host = self.open("setTimeout(() => { view.closeWindow(); view.echo(1); }, 300)")
+        host.wait_for("engine destroyed")
+        self.assertEqual(host.wait(), 0)
+        host = self.open("view.later(() => { view.closeWindow(); return view.echo(1); }, 1)")
         host.wait_for("engine destroyed")
         self.assertEqual(host.wait(), 0)
         host = self.open("setTimeout(() => view.close(), 300)")
@@ -241,22 +299,51 @@ class EngineTest(unittest.TestCase):
         host.wait_for("shown")
         host.send("abort")
         self.assertEqual(host.wait(), 3)
-        self.assertTrue(self.gone_within(40), (self.browsers(), profiles()))
+        self.traces.seconds_until_gone(8)
+
+    def test_killed_host_leaves_no_windows_browser(self):
+        """Such a browser is in a job; engine_peer.exe stands in for one. The next window deletes the profile."""
+        host, folder = self.open_with_peer()
+        peers = self.traces.processes()
+        self.assertEqual(len(peers), 1)
+        left = list(folder.glob("st-engine-*"))
+        self.assertEqual(len(left), 2)  # the profile, and the mark beside it
+        host.send("abort")
+        self.assertEqual(host.wait(), 3)
+        deadline = time.monotonic() + 5
+        while self.traces.processes():
+            self.assertLess(time.monotonic(), deadline)
+            time.sleep(0.05)
+        self.assertEqual(len(list(folder.glob("st-engine-*"))), 1)
+        (folder / "st-engine-0.life").write_text("left by a power failure")
+        (folder / "st-engine-0").mkdir()
+        host, folder = self.open_with_peer()
+        self.assertEqual(len(list(folder.glob("st-engine-*"))), 2)
+        self.assertFalse(set(left) & set(folder.glob("st-engine-*")))
+
+    def open_with_peer(self):
+        folder = pathlib.Path(self._folder.name) / "tmp"
+        folder.mkdir(exist_ok=True)
+        peer = folder / "engine_peer_good.exe"
+        shutil.copy(BIN / "engine_peer.exe", peer)
+        host = self.open("", "--browser", windows_path(peer), "--temporary", windows_path(folder))
+        host.wait_for("shown")
+        return host, folder
 
     def test_browser_that_dies_is_reported(self):
         host = self.open("function add(a) { return a; }")
         host.wait_for("shown")
-        for pid in self.browsers():
-            try:
-                os.kill(pid, signal.SIGKILL)
-            except ProcessLookupError:
-                pass
+        self.traces.kill()
         host.wait_for("debug 0 2 the")  # the page has crashed, or the browser is gone
         self.assertTrue(host.ask("call add [1]", "called").startswith("0 "))
         host.send("close")
         host.wait_for("ended")
-        for path in profiles():  # its watch was killed too
-            shutil.rmtree(path, ignore_errors=True) if os.path.isdir(path) else os.remove(path)
+        self.assertTrue(self.traces.left())  # the watch was killed too
+        next_host = self.open("")
+        next_host.wait_for("shown")
+        next_host.send("close")
+        next_host.wait_for("ended")
+        self.traces.seconds_until_gone(6)
 
     def test_browser_that_is_none_is_reported(self):
         broken = self.folder / "broken"
@@ -273,13 +360,33 @@ class EngineTest(unittest.TestCase):
             self.assertTrue(host.wait_for("loaded").startswith("0"))
             self.assertEqual(host.wait(), 1)
             self.assertIn(report, "\n".join(host.lines))
-        self.assertTrue(self.gone_within(40))
+        self.traces.seconds_until_gone(8)
+
+    def test_browser_that_speaks_nonsense_is_given_up(self):
+        cases = (("garbage", "the browser speaks no DevTools protocol"),
+                 ("endless", "the browser sends a message that is too large"),
+                 ("closing", "the browser's connection has ended"),
+                 ("html", "the browser's port refuses a web socket"),
+                 ("mute", "does not answer, error"),
+                 ("hanging", "it does not do what it is told"))
+        hosts = []
+        for manner, report in cases:
+            browser = self.folder / f"bad_browser_{manner}"
+            shutil.copy(SUPPORT / "bad_browser.py", browser)
+            browser.chmod(0o755)
+            hosts.append((manner, report, self.open("", "--browser", windows_path(browser))))
+        for manner, report, host in hosts:
+            with self.subTest(manner=manner):
+                self.assertTrue(host.wait_for("loaded").startswith("0"))
+                self.assertEqual(host.wait(), 1)
+                self.assertIn(report, "\n".join(host.lines))
+        self.traces.seconds_until_gone(8)
 
     def test_idle_page_costs_little(self):
         host = self.open("")
         host.wait_for("shown")
         time.sleep(3)
-        pids = self.browsers() + [int(pid) for pid in subprocess.run(
+        pids = self.traces.processes() + [int(pid) for pid in subprocess.run(
             ["pgrep", "-f", "engine_host.exe"], capture_output=True, text=True, check=False).stdout.split()]
         before = processor_seconds(pids)
         time.sleep(10)

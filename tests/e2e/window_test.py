@@ -5,7 +5,6 @@ folder, in screenshots/gui.
 import json
 import os
 import pathlib
-import shutil
 import socket
 import sys
 import tempfile
@@ -13,49 +12,18 @@ import time
 import unittest
 
 sys.path.insert(0, str(pathlib.Path(__file__).resolve().parents[1] / "support"))
-from browsers import browser_processes, processor_seconds  # noqa: E402
+from browser_traces import processor_seconds  # noqa: E402
 from fault_proxy import FaultProxy, Faults  # noqa: E402
 from ingest import IngestServer  # noqa: E402
+from interactive_stage import InteractiveStage  # noqa: E402
 from open_package import open_package  # noqa: E402
 from report_walk import ANSWERS, ReportWalk, choose_language  # noqa: E402
-from support_tool import BIN, PRIVATE_KEY, Stage, read_archive, windows_path  # noqa: E402
+from support_tool import BIN, PRIVATE_KEY, read_archive, windows_path  # noqa: E402
 from window_driver import Window, wait_for  # noqa: E402
 from x_session import XSession  # noqa: E402
 
 PICTURES = pathlib.Path(os.environ.get("ST_PICTURES", BIN.parent.parent / "screenshots/gui"))
-LIBRARIES = ("log.dll", "qxlink.dll", "framework.dll", "sciter.dll", "ServConfig.dll", "ServConfig.json",
-             "LanguageManager.dll")
-PRODUCT_LOGGER_XML = """<?xml version="1.0" encoding="utf-8"?>
-<!-- of the product -->
-<configuration path="{folder}">
-  <level>FATAL | CRITICAL | ERROR</level>
-  <depth>EXE</depth>
-  <maxSize>0</maxSize>
-</configuration>
-"""
 ENGLISH, ROMANIAN = ANSWERS["en"], ANSWERS["ro"]
-
-
-class InteractiveStage(Stage):
-    def __init__(self):
-        super().__init__("a stage 100% ș", LIBRARIES)
-        for folder in ("gui", "language"):
-            shutil.copytree(BIN / folder, self.path(folder))
-        self.logger_xml = self.path("Logger.xml")
-        self.logger_xml.write_text(PRODUCT_LOGGER_XML.format(folder=windows_path(self.logs)), encoding="utf-8")
-        self.former = self.logger_xml.read_bytes()
-
-    def send_to(self, port, **members):
-        document = {"endpoint": f"http://localhost:{port}/files", "allow_plain_http": True, "proxy": "none", "retries": 1,
-                    "retry_delay": 0.05, "outbox": windows_path(self.outbox), **members}
-        self.path("qxlink.json").write_text(json.dumps(document), encoding="utf-8")
-
-    def logging_is_raised(self):
-        text = self.logger_xml.read_text(encoding="utf-8")
-        return "<depth>MODULE</depth>" in text and "TRACE" in text
-
-    def logging_is_as_before(self):
-        return self.logger_xml.read_bytes() == self.former and not self.path("Logger.xml.raised").exists()
 
 
 class WindowTest(unittest.TestCase):
@@ -67,7 +35,7 @@ class WindowTest(unittest.TestCase):
         cls.addClassCleanup(cls.session.__exit__)
 
     def setUp(self):
-        self.stage = InteractiveStage()
+        self.stage = InteractiveStage(self.session)
         self.addCleanup(self.stage.close)
         scratch = tempfile.TemporaryDirectory(prefix="st_ingest_")
         self.addCleanup(scratch.cleanup)
@@ -84,7 +52,7 @@ class WindowTest(unittest.TestCase):
 
     def assertEnded(self, window):
         self.assertEqual(window.wait_for_end(), 0)
-        self.assertTrue(self.stage.logging_is_as_before())
+        self.assertTrue(self.stage.is_as_before())
 
     def assertReceived(self, server, answers, recorded):
         """The one package that the server has holds the manifest and exactly these answers; returns the times."""
@@ -109,8 +77,8 @@ class WindowTest(unittest.TestCase):
         window = self.open()
         line.upstream = Faults(stall_after=2000, stall_seconds=1)  # so that the progress can be seen
         walk = ReportWalk(window, ENGLISH, PICTURES / "en")
-        walk.whole(while_recording=lambda: self.assertTrue(self.stage.logging_is_raised()))
-        self.assertTrue(self.stage.logging_is_as_before())
+        walk.whole(while_recording=lambda: self.assertTrue(self.stage.is_raised()))
+        self.assertTrue(self.stage.is_as_before())
         walk.picture("progress")
         walk.finish()
         window.click("#success button")
@@ -173,7 +141,7 @@ class WindowTest(unittest.TestCase):
         walk = ReportWalk(window, ENGLISH)
         walk.to_the_recording()
         walk.start_recording()
-        self.assertTrue(self.stage.logging_is_raised())
+        self.assertTrue(self.stage.is_raised())
         window.key("alt+F4")
         self.assertEnded(window)
 
@@ -243,9 +211,10 @@ class WindowTest(unittest.TestCase):
         time.sleep(0.2)
         return window.screen.pixels(area) == before
 
-    def share_of_a_core(self, window, seconds):
+    @staticmethod
+    def share_of_a_core(window, seconds):
         """What the program and its browser use."""
-        pids = [window.process.pid, *browser_processes(self.session)]
+        pids = [window.process.pid, *window.traces.processes()]
         before = processor_seconds(pids)
         time.sleep(seconds)
         return (processor_seconds(pids) - before) / seconds

@@ -78,8 +78,7 @@ class PageProbe:
         self._socket = _WebSocket(int(port), path)
         self._session = None
         self._number = 0
-        pages = [info["targetId"] for info in self._command("Target.getTargets")["targetInfos"] if info["type"] == "page"]
-        self._session = self._command("Target.attachToTarget", targetId=pages[0], flatten=True)["sessionId"]
+        self._session = self._command("Target.attachToTarget", targetId=self.pages()[0], flatten=True)["sessionId"]
 
     def __enter__(self):
         return self
@@ -101,6 +100,13 @@ class PageProbe:
         if "error" in answer:
             raise ProbeError(f"{method}: {answer['error']}")
         return answer["result"]
+
+    def pages(self):
+        """The browser's names of all pages that are open."""
+        session, self._session = self._session, None
+        targets = self._command("Target.getTargets")["targetInfos"]
+        self._session = session
+        return [target["targetId"] for target in targets if target["type"] == "page"]
 
     def read(self, expression):
         """The value of a script expression that changes nothing."""

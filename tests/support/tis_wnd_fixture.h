@@ -66,6 +66,10 @@ class TisWndTest : public testing::Test {
       m_catalogue = catalogue;
       return m_translator;
     };
+    services.showMessage = [this](HWND owner, const std::wstring& text) {
+      EXPECT_EQ(owner, m_window->Handle());
+      m_messages.push_back(text);
+    };
     services.productConfig = [] { return nullptr; };
     return services;
   }
@@ -98,6 +102,7 @@ class TisWndTest : public testing::Test {
   std::shared_ptr<qx::ILanguageManager> m_translator = std::make_shared<Translator>();
   std::wstring m_catalogue;
   std::vector<std::wstring> m_notified;
+  std::vector<std::wstring> m_messages;
   std::unique_ptr<TisWnd> m_window;
 };
 

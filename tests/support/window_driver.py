@@ -2,13 +2,10 @@
 server (xdotool); where things are on the page, and what it says, is read over the browser's own port.
 """
 import contextlib
-import os
-import shutil
-import signal
 import subprocess
 import time
 
-from browsers import processes_of, profiles_in_use
+from browser_traces import BrowserTraces
 from page_probe import PageProbe, ProbeError
 from screen import Screen
 
@@ -50,12 +47,11 @@ class Window:
     """The program's window from its start to the end of the process. `command` is the program with its arguments."""
 
     def __init__(self, session, command, folder):
-        self._session = session
         self._environment = session.environment
         self.screen = Screen(session.frame_buffer)
         self.handle = None
         self.page = None
-        self.profile = None
+        self.traces = BrowserTraces(session)
         self.started = time.monotonic()
         self.process = start(session, command, folder)
 
@@ -78,12 +74,7 @@ class Window:
         if self.process.poll() is None:  # the test has failed, or has seen enough
             self.process.kill()
             self.process.wait()
-            for pid in processes_of([self.profile] if self.profile else []):
-                with contextlib.suppress(ProcessLookupError):
-                    os.kill(pid, signal.SIGKILL)
-            if self.profile:
-                shutil.rmtree(self.profile, ignore_errors=True)
-                self.profile.with_name(self.profile.name + ".life").unlink(missing_ok=True)
+            self.traces.kill()
         self.screen.close()
 
     # --- What there is
@@ -106,11 +97,9 @@ class Window:
         return []
 
     def _connect(self):
-        for profile in profiles_in_use(self._session):
-            with contextlib.suppress(OSError, ProbeError, ValueError, IndexError):
-                page = PageProbe(profile)
-                self.profile = profile
-                return page
+        profile = self.traces.profile()
+        with contextlib.suppress(OSError, ProbeError, ValueError, IndexError):
+            return profile and PageProbe(profile)
         return None
 
     def place(self):
@@ -246,6 +235,5 @@ class Window:
             code = self.process.wait(seconds)
         except subprocess.TimeoutExpired:
             raise AssertionError(f"the program does not end within {seconds} seconds") from None
-        wait_for("the end of the browser", lambda: not processes_of([self.profile]), 30)
-        wait_for("the end of the profile", lambda: not self.profile.exists())
+        self.traces.seconds_until_gone(8)
         return code
