@@ -102,7 +102,6 @@ class Report {
   #showTimeline(name) {
     if (name === 'overview') this.#timeline?.showIn(this.#timelineHost);
     else if (name === this.#report.timeline?.table.id) this.#timeline.showIn(this.#views.get(name).top);
-    this.#timeline?.redraw();
   }
 
   #startSearchField() {

@@ -45,7 +45,8 @@ export class Timeline {
   showIn(host) {
     host.append(this.element);
     if (!this.#events) return;
-    if (!this.#chart) this.#start();
+    if (this.#chart) this.redraw();
+    else this.#start();
   }
 
   // After the colours or the width have changed.
