@@ -159,6 +159,8 @@ test('tables sort by mouse and keyboard, filter by column, and a tree stays one'
   await eventually(() => count(page), '40 of 160 rows');
   await page.fill(`${view} .ag-floating-filter[aria-colindex="4"] input`, 'yes');
   await eventually(() => count(page), '8 of 160 rows');
+  await page.click(`${view} .chip`);
+  await eventually(() => count(page), '160 rows');
 
   await go(page, 'processes');
   assert.deepEqual((await column(page, 'c1')).slice(0, 4), ['4', '16', '64', '256']);
@@ -216,6 +218,11 @@ test('the evidence of a finding leads to its row, which is marked, in view and s
   assert.equal(await page.textContent(`${view} .ag-row.marked [col-id=c1]`), '196');
   assert.ok(await page.locator(`${view} .ag-row.marked`).isVisible());
   assert.match(await page.textContent(`${view} .details`), /Evidence of: A program of the product.*guardsvc\.exe/s);
+  await page.click(`${view} .details .close`);
+  assert.equal(await page.isVisible(`${view} .details`), false);
+  await page.click(`${view} .ag-row.marked [col-id=c1]`);
+  await page.keyboard.press('ArrowUp');
+  await eventually(() => page.textContent(`${view} .details`).then((text) => text.includes('PID184')), true);
   await page.goBack();
   await page.waitForSelector('.overview:not([hidden])');
   await search(page, '');

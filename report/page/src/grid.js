@@ -28,7 +28,8 @@ export class Grid {
   #open = null;          // of a tree with collapsed rows: a byte for each row
   #marked = -1;
 
-  // `onRow(index)` is called when a row gets the focus or a click, `onShown(count)` when the rows that are shown have changed.
+  // `onRow(index, chosen)` is called when a row gets the focus, `chosen` by a click or Enter; `onShown(count)` when the rows
+  // that are shown have changed.
   // severity: the index of the column that holds one, or -1.
   constructor(table, host, {cited, severity, onRow, onShown}) {
     adoptGridStyles();
@@ -57,12 +58,18 @@ export class Grid {
       onModelUpdated: () => onShown(this.shown),
       onCellFocused: ({rowIndex}) => {
         const node = rowIndex == null ? null : this.#api.getDisplayedRowAtIndex(rowIndex);
-        if (node) onRow(node.data.index);
+        if (node) onRow(node.data.index, false);
       },
+      onCellClicked: ({data}) => onRow(data.index, true),
+      onCellKeyDown: ({data, event}) => { if (event.key === 'Enter') onRow(data.index, true); },
     });
   }
 
   get shown() { return this.#api ? this.#api.getDisplayedRowCount() : 0; }
+
+  get filtered() { return this.#api !== undefined && Object.keys(this.#api.getFilterModel()).length > 0; }
+
+  clearFilters() { this.#api.setFilterModel(null); }
 
   // The indexes of the rows that are shown, in their order, at most `limit`.
   rows(limit) {
@@ -81,7 +88,7 @@ export class Grid {
 
   // Scrolls to a row and marks it; what hides it is cleared, but for the search and the interval, which the caller owns.
   reveal(index) {
-    if (Object.keys(this.#api.getFilterModel()).length > 0) this.#api.setFilterModel(null);
+    if (this.filtered) this.clearFilters();
     for (let above = this.#table.tree?.parent[index] ?? -1; above >= 0; above = this.#table.tree.parent[above]) {
       this.#collapsed.delete(above);
     }

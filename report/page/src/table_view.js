@@ -35,7 +35,10 @@ export class TableView {
       element('div', {class: 'heading'}, element('h2', {}, foreign(this.#table.title ?? this.#table.id)), this.#count, this.#limits), this.top,
       element('div', {class: 'body'}, this.#gridHost, this.#details));
     this.#grid = new Grid(this.#table, this.#gridHost, {
-      cited: this.#findings, severity: this.#severity, onRow: (index) => this.#showDetails(index), onShown: (shown) => this.#describe(shown)});
+      cited: this.#findings, severity: this.#severity,
+      onRow: (index, chosen) => { if (chosen || !this.#details.hidden) this.#showDetails(index); },
+      onShown: (shown) => this.#describe(shown),
+    });
     if (this.#matches) this.#grid.setMatches(this.#matches);
     if (this.#interval) this.#grid.setInterval(this.#interval);
     this.#describe(this.#grid.shown);
@@ -79,10 +82,11 @@ export class TableView {
   #describe(shown) {
     const all = this.#table.rows.length;
     this.#count.textContent = shown === all ? plural(all, 'row') : `${formatCount(shown)} of ${plural(all, 'row')}`;
-    this.#limits.replaceChildren();
-    if (!this.#interval) return;
-    this.#limits.append(element('button', {type: 'button', class: 'chip', onclick: () => this.setInterval(null)},
-      `${formatTime(this.#interval.from)} to ${formatTime(this.#interval.to)} ✕`));
+    const chip = (text, remove) => element('button', {type: 'button', class: 'chip', title: 'Remove this limit', onclick: remove}, `${text} ✕`);
+    this.#limits.replaceChildren(...[
+      this.#interval && chip(`${formatTime(this.#interval.from)} to ${formatTime(this.#interval.to)}`, () => this.setInterval(null)),
+      this.#grid?.filtered && chip('Column filters', () => this.#grid.clearFilters()),
+    ].filter(Boolean));
   }
 
   #showDetails(index) {
