@@ -43,6 +43,7 @@ ModuleRegistry.registerModules([
 
 const kByDate = ['software', 'updates']; // tables that open with what came last at the top
 const kSampleRows = 300;
+const kIndent = 2.3; // letters
 const [kLetter, kPadding, kNarrowest, kNarrowestTime, kWidest] = [7.1, 30, 96, 178, 420]; // pixels
 
 export class Grid {
@@ -213,14 +214,14 @@ export class Grid {
 
   // By the texts of the first rows: most fit, a few long ones do not widen the column.
   #width(column, index) {
+    const tree = index === 0 ? this.#table.tree : null;
     const lengths = this.#table.rows
       .slice(0, kSampleRows)
-      .map((cells) => formatCell(cells[index], column.type).length)
+      .map((cells, row) => formatCell(cells[index], column.type).length + (tree ? (tree.depth[row] + 1) * kIndent : 0))
       .sort((a, b) => a - b);
-    const usual = lengths[Math.floor(lengths.length * 0.9)] ?? 0;
-    const depth = this.#table.tree && index === 0 ? 90 : 0;
+    const usual = lengths[tree ? lengths.length - 1 : Math.floor(lengths.length * 0.9)] ?? 0;
     const dot = index === this.#severity ? 16 : 0;
-    const width = Math.max(usual, (column.title ?? column.id).length + 3) * kLetter + kPadding + depth + dot;
+    const width = Math.max(usual, (column.title ?? column.id).length + 3) * kLetter + kPadding + dot;
     return Math.round(Math.min(Math.max(width, column.type === 'time' ? kNarrowestTime : kNarrowest), kWidest));
   }
 

@@ -55,14 +55,14 @@ function describe(source) {
   const parts = [
     visible(source.name ?? 'unnamed package'),
     Number.isFinite(source.bytes) ? formatBytes(source.bytes) : null,
-    source.collectedAt ? `collected ${wallClock(source.collectedAt)}` : 'time of collection unknown',
+    source.collectedAt ? `collected ${readable(source.collectedAt)}` : 'time of collection unknown',
   ];
   return parts.filter(Boolean).join(' · ');
 }
 
-// 2026-01-31T10:11:12Z as the manifest has it: the customer's clock.
-function wallClock(time) {
-  return visible(String(time).replace(/^(\d{4}-\d\d-\d\d)T(\d\d:\d\d(:\d\d)?)(\.\d+)?Z?$/, '$1 $2'));
+// 2026-01-31T10:11:12Z, of the whole report the only time that is not the customer's clock.
+function readable(time) {
+  return visible(String(time).replace(/^(\d{4}-\d\d-\d\d)T(\d\d:\d\d(:\d\d)?)(\.\d+)?Z$/, '$1 $2 UTC'));
 }
 
 function machine({machine: text, product, source, tool}) {
