@@ -7,7 +7,8 @@ const kMaximumTime = 8.64e15;
 export function formatTime(milliseconds) {
   if (!(Math.abs(milliseconds) <= kMaximumTime)) return String(milliseconds);
   const time = new Date(milliseconds);
-  return `${formatDay(milliseconds)} ${two(time.getUTCHours())}:${two(time.getUTCMinutes())}:${two(time.getUTCSeconds())}`;
+  const clock = [time.getUTCHours(), time.getUTCMinutes(), time.getUTCSeconds()].map(two).join(':');
+  return `${formatDay(milliseconds)} ${clock}`;
 }
 
 export function formatDay(milliseconds) {

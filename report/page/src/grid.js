@@ -1,7 +1,21 @@
 // One table of the report in a grid that draws only the rows in view.
 import {
-  CellStyleModule, ClientSideRowModelApiModule, ClientSideRowModelModule, ColumnApiModule, DateFilterModule, EventApiModule, ExternalFilterModule, LocaleModule,
-  ModuleRegistry, NumberFilterModule, RenderApiModule, RowApiModule, RowStyleModule, ScrollApiModule, TextFilterModule, createGrid,
+  CellStyleModule,
+  ClientSideRowModelApiModule,
+  ClientSideRowModelModule,
+  ColumnApiModule,
+  DateFilterModule,
+  EventApiModule,
+  ExternalFilterModule,
+  LocaleModule,
+  ModuleRegistry,
+  NumberFilterModule,
+  RenderApiModule,
+  RowApiModule,
+  RowStyleModule,
+  ScrollApiModule,
+  TextFilterModule,
+  createGrid,
 } from 'ag-grid-community';
 import {appendText, hasSpecial, visible} from './text.js';
 import {adoptGridStyles, themeOptions} from './grid_theme.js';
@@ -11,25 +25,39 @@ import {ranksOf} from './ranks.js';
 import {severityOf} from './severity.js';
 
 ModuleRegistry.registerModules([
-  CellStyleModule, ClientSideRowModelApiModule, ClientSideRowModelModule, ColumnApiModule, DateFilterModule, EventApiModule, ExternalFilterModule, LocaleModule,
-  NumberFilterModule, RenderApiModule, RowApiModule, RowStyleModule, ScrollApiModule, TextFilterModule]);
+  CellStyleModule,
+  ClientSideRowModelApiModule,
+  ClientSideRowModelModule,
+  ColumnApiModule,
+  DateFilterModule,
+  EventApiModule,
+  ExternalFilterModule,
+  LocaleModule,
+  NumberFilterModule,
+  RenderApiModule,
+  RowApiModule,
+  RowStyleModule,
+  ScrollApiModule,
+  TextFilterModule,
+]);
 
-const kByDate = ['software', 'updates'];  // tables that open with what came last at the top
+const kByDate = ['software', 'updates']; // tables that open with what came last at the top
 const kSampleRows = 300;
-const [kLetter, kPadding, kNarrowest, kNarrowestTime, kWidest] = [7.1, 30, 96, 178, 420];  // pixels
+const kIndent = 2.3; // letters
+const [kLetter, kPadding, kNarrowest, kNarrowestTime, kWidest] = [7.1, 30, 96, 178, 420]; // pixels
 
 export class Grid {
   #table;
   #severity;
   #api;
-  #matches = null;       // of the search, a byte for each row, or null: all
-  #interval = null;      // {column, from, to}: rows with a time in it only
+  #matches = null; // of the search, a byte for each row, or null: all
+  #interval = null; // {column, from, to}: rows with a time in it only
   #collapsed = new Set();
-  #open = null;          // of a tree with collapsed rows: a byte for each row
+  #open = null; // of a tree with collapsed rows: a byte for each row
   #marked = -1;
 
-  // `onRow(index)` is called when a row gets the focus or a click, `onShown(count)` when the rows that are shown have changed.
-  // severity: the index of the column that holds one, or -1.
+  // `onRow(index, chosen)` is called when a row gets the focus, `chosen` by a click or Enter; `onShown(count)` when the
+  // rows that are shown have changed. severity: the index of the column that holds one, or -1.
   constructor(table, host, {cited, severity, onRow, onShown}) {
     adoptGridStyles();
     this.#table = table;
@@ -39,11 +67,18 @@ export class Grid {
       ...themeOptions,
       columnDefs: table.columns.map((column, index) => this.#column(column, index)),
       rowData: Array.from(order, (index) => ({index, cells: table.rows[index]})),
-      defaultColDef: {sortable: true, resizable: true, filter: true, floatingFilter: true, suppressHeaderMenuButton: true},
+      defaultColDef: {
+        sortable: true,
+        resizable: true,
+        filter: true,
+        floatingFilter: true,
+        suppressHeaderMenuButton: true,
+      },
       suppressFieldDotNotation: true,
       suppressDragLeaveHidesColumns: true,
       suppressCellFocus: false,
       animateRows: false,
+      rowBuffer: 6,
       enableCellTextSelection: true,
       ensureDomOrder: true,
       isExternalFilterPresent: () => this.#matches !== null || this.#interval !== null || this.#open !== null,
@@ -57,16 +92,33 @@ export class Grid {
       onModelUpdated: () => onShown(this.shown),
       onCellFocused: ({rowIndex}) => {
         const node = rowIndex == null ? null : this.#api.getDisplayedRowAtIndex(rowIndex);
-        if (node) onRow(node.data.index);
+        if (node) onRow(node.data.index, false);
+      },
+      onCellClicked: ({data}) => onRow(data.index, true),
+      onCellKeyDown: ({data, event}) => {
+        if (event.key === 'Enter') onRow(data.index, true);
       },
     });
   }
 
-  get shown() { return this.#api ? this.#api.getDisplayedRowCount() : 0; }
+  get shown() {
+    return this.#api ? this.#api.getDisplayedRowCount() : 0;
+  }
+
+  get filtered() {
+    return this.#api !== undefined && Object.keys(this.#api.getFilterModel()).length > 0;
+  }
+
+  clearFilters() {
+    this.#api.setFilterModel(null);
+  }
 
   // The indexes of the rows that are shown, in their order, at most `limit`.
   rows(limit) {
-    return Array.from({length: Math.min(limit, this.shown)}, (_, at) => this.#api.getDisplayedRowAtIndex(at).data.index);
+    return Array.from(
+      {length: Math.min(limit, this.shown)},
+      (_, at) => this.#api.getDisplayedRowAtIndex(at).data.index,
+    );
   }
 
   setMatches(matches) {
@@ -79,16 +131,19 @@ export class Grid {
     this.#api.onFilterChanged();
   }
 
-  // Scrolls to a row and marks it; what hides it is cleared, but for the search and the interval, which the caller owns.
+  // Scrolls to a row and marks it; what hides it is cleared, but for the search and the interval, which the caller
+  // owns.
   reveal(index) {
-    if (Object.keys(this.#api.getFilterModel()).length > 0) this.#api.setFilterModel(null);
+    if (this.filtered) this.clearFilters();
     for (let above = this.#table.tree?.parent[index] ?? -1; above >= 0; above = this.#table.tree.parent[above]) {
       this.#collapsed.delete(above);
     }
     this.#filterTree();
     this.#marked = index;
     let found = null;
-    this.#api.forEachNodeAfterFilterAndSort((node) => { if (node.data.index === index) found = node; });
+    this.#api.forEachNodeAfterFilterAndSort((node) => {
+      if (node.data.index === index) found = node;
+    });
     this.#api.redrawRows();
     if (!found) return;
     this.#api.ensureNodeVisible(found, 'middle');
@@ -111,7 +166,9 @@ export class Grid {
 
   #regroup(nodes) {
     const byIndex = new Map(nodes.map((node) => [node.data.index, node]));
-    regroup(this.#table.tree, [...byIndex.keys()]).forEach((index, at) => { nodes[at] = byIndex.get(index); });
+    regroup(this.#table.tree, [...byIndex.keys()]).forEach((index, at) => {
+      nodes[at] = byIndex.get(index);
+    });
   }
 
   #column(column, index) {
@@ -126,7 +183,9 @@ export class Grid {
       valueGetter: ({data}) => data.cells[index],
       valueFormatter: ({value}) => formatCell(value, column.type),
       filterValueGetter: isText ? ({data}) => formatCell(data.cells[index], column.type) : undefined,
-      filter: {number: 'agNumberColumnFilter', bytes: 'agNumberColumnFilter', time: 'agDateColumnFilter'}[column.type] ?? 'agTextColumnFilter',
+      filter:
+        {number: 'agNumberColumnFilter', bytes: 'agNumberColumnFilter', time: 'agDateColumnFilter'}[column.type] ??
+        'agTextColumnFilter',
       filterParams: {debounceMs: 120, comparator: column.type === 'time' ? compareDay : undefined},
       comparator: (a, b, one, other) => {
         ranks ??= ranksOf(rows, index);
@@ -134,10 +193,12 @@ export class Grid {
       },
       cellClass: isNumber ? 'number' : undefined,
       headerClass: isNumber ? 'ag-right-aligned-header' : undefined,
-      cellRendererSelector: ({value}) => (typeof value === 'string' && hasSpecial(value) ? {component: specialCell} : undefined),
+      cellRendererSelector: ({value}) =>
+        typeof value === 'string' && hasSpecial(value) ? {component: specialCell} : undefined,
       initialWidth: this.#width(column, index),
     };
-    if (kByDate.includes(this.#table.id) && this.#table.columns.findIndex(({type}) => type === 'time') === index) definition.initialSort = 'desc';
+    if (kByDate.includes(this.#table.id) && this.#table.columns.findIndex(({type}) => type === 'time') === index)
+      definition.initialSort = 'desc';
     if (index === this.#severity) definition.cellClass = ({value}) => `severity ${severityOf(value)}`;
     if (column.id === 'signed') definition.cellClass = ({value}) => (value === false ? 'severity warning' : undefined);
     if (column.id === 'kind') definition.cellClass = ({value}) => `kind-${/^[a-z]+$/.test(value) ? value : 'other'}`;
@@ -153,11 +214,14 @@ export class Grid {
 
   // By the texts of the first rows: most fit, a few long ones do not widen the column.
   #width(column, index) {
-    const lengths = this.#table.rows.slice(0, kSampleRows).map((cells) => formatCell(cells[index], column.type).length).sort((a, b) => a - b);
-    const usual = lengths[Math.floor(lengths.length * 0.9)] ?? 0;
-    const depth = this.#table.tree && index === 0 ? 90 : 0;
+    const tree = index === 0 ? this.#table.tree : null;
+    const lengths = this.#table.rows
+      .slice(0, kSampleRows)
+      .map((cells, row) => formatCell(cells[index], column.type).length + (tree ? (tree.depth[row] + 1) * kIndent : 0))
+      .sort((a, b) => a - b);
+    const usual = lengths[tree ? lengths.length - 1 : Math.floor(lengths.length * 0.9)] ?? 0;
     const dot = index === this.#severity ? 16 : 0;
-    const width = Math.max(usual, (column.title ?? column.id).length + 3) * kLetter + kPadding + depth + dot;
+    const width = Math.max(usual, (column.title ?? column.id).length + 3) * kLetter + kPadding + dot;
     return Math.round(Math.min(Math.max(width, column.type === 'time' ? kNarrowestTime : kNarrowest), kWidest));
   }
 

@@ -31,7 +31,8 @@ export const themeOptions = {
   themeStyleContainer: container,
 };
 
-// To be called before the first grid is made, which measures its parts at once: an empty one, never shown, writes the styles.
+// To be called before the first grid is made, which measures its parts at once: an empty one, never shown, writes the
+// styles.
 export function adoptGridStyles() {
   if (adopted) return;
   adopted = true;

@@ -2,14 +2,22 @@
 import {kSeverities, severityOf} from './severity.js';
 
 const [kSecond, kMinute, kHour, kDay] = [1000, 60000, 3600000, 86400000];
-const kWidths = [1, 2, 5, 10, 30].map((count) => count * kSecond)
-  .concat([1, 2, 5, 10, 30].map((count) => count * kMinute), [1, 2, 3, 6, 12].map((count) => count * kHour), [1, 7, 30, 365].map((count) => count * kDay));
+const kWidths = [1, 2, 5, 10, 30]
+  .map((count) => count * kSecond)
+  .concat(
+    [1, 2, 5, 10, 30].map((count) => count * kMinute),
+    [1, 2, 3, 6, 12].map((count) => count * kHour),
+    [1, 7, 30, 365].map((count) => count * kDay),
+  );
 const kMostBins = 140;
 
-// The events of a table in the order of time: {times, severities (indexes into kSeverities), from, to}; null without any.
+// The events of a table in the order of time: {times, severities (indexes into kSeverities), from, to}; null without
+// any.
 export function readEvents(rows, timeColumn, severityColumn) {
   const order = [];
-  rows.forEach((cells, row) => { if (Number.isFinite(cells[timeColumn])) order.push(row); });
+  rows.forEach((cells, row) => {
+    if (Number.isFinite(cells[timeColumn])) order.push(row);
+  });
   if (order.length === 0) return null;
   order.sort((a, b) => rows[a][timeColumn] - rows[b][timeColumn]);
   const times = Float64Array.from(order, (row) => rows[row][timeColumn]);

@@ -16,15 +16,15 @@ const at = (id) => document.getElementById(id);
 
 class Report {
   #report;
-  #views = new Map();     // id of a table -> TableView
-  #counts = new Map();    // id of a part -> number of matches
+  #views = new Map(); // id of a table -> TableView
+  #counts = new Map(); // id of a part -> number of matches
   #navigation;
   #overview = element('section', {class: 'view overview', 'aria-label': 'Overview', hidden: true});
   #timeline = null;
   #timelineHost = null;
   #search;
   #query = '';
-  #current = null;        // id of the part in view
+  #current = null; // id of the part in view
 
   constructor(report) {
     this.#report = report;
@@ -37,13 +37,18 @@ class Report {
     this.#search = new Search(report.tables, (table, matches, count) => this.#showMatches(table, matches, count));
     this.#startSearchField();
     startTheme(at('theme'), () => this.#timeline?.redraw());
-    startPrinting([...this.#views.values()], at('print-view'), () => {
-      this.#overview.hidden = false;
-      this.#showTimeline('overview');
-    }, () => {
-      this.#overview.hidden = this.#current !== 'overview';
-      this.#showTimeline(this.#current);
-    });
+    startPrinting(
+      [...this.#views.values()],
+      at('print-view'),
+      () => {
+        this.#overview.hidden = false;
+        this.#showTimeline('overview');
+      },
+      () => {
+        this.#overview.hidden = this.#current !== 'overview';
+        this.#showTimeline(this.#current);
+      },
+    );
     at('print').addEventListener('click', () => print());
     addEventListener('hashchange', () => this.#go());
     this.#go();
@@ -54,20 +59,32 @@ class Report {
     const findings = new Map();
     for (const {title, evidence} of this.#report.findings) {
       for (const one of evidence) {
-        if (one.table === table.id && Number.isInteger(one.row)) findings.set(one.row, [...(findings.get(one.row) ?? []), title]);
+        if (one.table === table.id && Number.isInteger(one.row))
+          findings.set(one.row, [...(findings.get(one.row) ?? []), title]);
       }
     }
-    const host = element('section', {class: 'view table', 'aria-label': visible(table.title ?? table.id), hidden: true});
+    const host = element('section', {
+      class: 'view table',
+      'aria-label': visible(table.title ?? table.id),
+      hidden: true,
+    });
     at('main').append(host);
     const severity = this.#report.timeline?.table === table ? this.#report.timeline.severity : -1;
-    this.#views.set(table.id, new TableView(table, host, {findings, severity, onClearSearch: () => this.#setQuery('')}));
+    this.#views.set(
+      table.id,
+      new TableView(table, host, {findings, severity, onClearSearch: () => this.#setQuery('')}),
+    );
     this.#navigation.setCount(table.id, table.rows.length);
   }
 
   #startOverview() {
     const {timeline} = this.#report;
     if (timeline) {
-      this.#timelineHost = element('section', {class: 'card', id: 'timeline', 'aria-label': 'Events over time'}, element('h2', {}, 'Events over time'));
+      this.#timelineHost = element(
+        'section',
+        {class: 'card', id: 'timeline', 'aria-label': 'Events over time'},
+        element('h2', {}, 'Events over time'),
+      );
       this.#timeline = new Timeline(timeline, (from, to) => {
         this.#views.get(timeline.table.id).setInterval({column: timeline.time, from, to});
         location.hash = encodeURIComponent(timeline.table.id);
@@ -75,7 +92,8 @@ class Report {
     }
     const linkOf = ({table, row}) => {
       if (!this.#views.has(table)) return null;
-      return `#${encodeURIComponent(table)}${row >= 0 && row < this.#views.get(table).table.rows.length ? `/${row}` : ''}`;
+      const exists = row >= 0 && row < this.#views.get(table).table.rows.length;
+      return `#${encodeURIComponent(table)}${exists ? `/${row}` : ''}`;
     };
     showOverview(this.#report, this.#overview, {timelineHost: this.#timelineHost, linkOf});
     this.#navigation.setCount('overview', null);
@@ -102,7 +120,6 @@ class Report {
   #showTimeline(name) {
     if (name === 'overview') this.#timeline?.showIn(this.#timelineHost);
     else if (name === this.#report.timeline?.table.id) this.#timeline.showIn(this.#views.get(name).top);
-    this.#timeline?.redraw();
   }
 
   #startSearchField() {

@@ -3,7 +3,7 @@ import {element, foreign} from './dom.js';
 import {formatCount} from './format.js';
 
 export class Navigation {
-  #links = new Map();  // id -> {link, count}
+  #links = new Map(); // id -> {link, count}
 
   constructor(host, tables) {
     const list = element('ul', {});
@@ -14,8 +14,10 @@ export class Navigation {
       this.#links.set(id, {link, count});
     };
     add('overview', 'Overview');
-    const isOther = ({id}) => id.startsWith('doc-');  // documents that have no table of their own
-    tables.forEach((table, index) => add(table.id, table.title ?? table.id, isOther(table) && !(index > 0 && isOther(tables[index - 1]))));
+    const isOther = ({id}) => id.startsWith('doc-'); // documents that have no table of their own
+    tables.forEach((table, index) =>
+      add(table.id, table.title ?? table.id, isOther(table) && !(index > 0 && isOther(tables[index - 1]))),
+    );
     host.append(list);
   }
 

@@ -2,8 +2,8 @@
 import {element, foreign} from './dom.js';
 import {formatCell, formatCount, plural} from './format.js';
 
-const kMostRows = 200;   // of a table
-const kMostText = 500;   // characters of a cell
+const kMostRows = 200; // of a table
+const kMostText = 500; // characters of a cell
 
 // `before` and `after` are called around the printing, when the colours are those of paper and when they are back.
 export function startPrinting(views, host, before, after) {
@@ -28,19 +28,42 @@ function printed(view) {
   const {rows: shown, count} = view.printed(kMostRows);
   const kept = columns.map((column, index) => ({...column, index})).filter(({index}) => index !== parent || !tree);
   const cell = (text) => foreign(text.length > kMostText ? `${text.slice(0, kMostText)}…` : text);
-  const body = shown.map((row) => element('tr', {}, ...kept.map(({index, type}, at) => {
-    const made = element('td', {class: ['number', 'bytes', 'time'].includes(type) ? 'short' : null}, cell(formatCell(rows[row][index], type)));
-    if (tree && at === 0) made.style.paddingInlineStart = `${4 + Math.min(tree.depth[row], 24) * 6}pt`;
-    return made;
-  })));
-  return element('section', {}, element('h2', {}, foreign(title ?? id)),
+  const body = shown.map((row) =>
+    element(
+      'tr',
+      {},
+      ...kept.map(({index, type}, at) => {
+        const made = element(
+          'td',
+          {class: ['number', 'bytes', 'time'].includes(type) ? 'short' : null},
+          cell(formatCell(rows[row][index], type)),
+        );
+        if (tree && at === 0) made.style.paddingInlineStart = `${4 + Math.min(tree.depth[row], 24) * 6}pt`;
+        return made;
+      }),
+    ),
+  );
+  return element(
+    'section',
+    {},
+    element('h2', {}, foreign(title ?? id)),
     element('p', {class: 'quiet'}, describe(shown.length, count, rows.length)),
-    element('table', {}, element('thead', {}, element('tr', {}, ...kept.map((column) => element('th', {scope: 'col'}, foreign(column.title ?? column.id))))),
-      element('tbody', {}, ...body)));
+    element(
+      'table',
+      {},
+      element(
+        'thead',
+        {},
+        element('tr', {}, ...kept.map((column) => element('th', {scope: 'col'}, foreign(column.title ?? column.id)))),
+      ),
+      element('tbody', {}, ...body),
+    ),
+  );
 }
 
 function describe(shown, count, all) {
   const chosen = count === all ? '' : ` that match, of ${formatCount(all)}`;
   if (shown === count) return `${plural(count, 'row')}${chosen}`;
-  return `The first ${formatCount(shown)} of ${plural(count, 'row')}${chosen} are printed; the report on the screen holds the rest.`;
+  const rows = `The first ${formatCount(shown)} of ${plural(count, 'row')}${chosen}`;
+  return `${rows} are printed; the report on the screen holds the rest.`;
 }

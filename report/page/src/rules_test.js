@@ -1,20 +1,23 @@
 // The rules of the page that need no browser.
 import assert from 'node:assert/strict';
 import {test} from 'node:test';
-import {binWidth, countBins, lowerBound, readEvents} from './histogram.js';
+
 import {complete} from './data.js';
 import {formatBytes, formatCell, formatTime} from './format.js';
-import {hasSpecial, visible} from './text.js';
-import {layOut, openRows, regroup, withAncestors} from './tree.js';
-import {ranksOf} from './ranks.js';
+import {binWidth, countBins, lowerBound, readEvents} from './histogram.js';
 import {readHash} from './navigation.js';
+import {ranksOf} from './ranks.js';
 import {Search, wordsOf} from './search.js';
 import {severityOf} from './severity.js';
+import {hasSpecial, visible} from './text.js';
+import {layOut, openRows, regroup, withAncestors} from './tree.js';
 
 test('characters that hide, control or turn are shown as signs, all others as they are', () => {
   for (const [text, shown] of [
-    ['a\u0000b', 'aU+0000b'], ['\u001b[31m', 'U+001B[31m'], ['\u0085', 'U+0085'], ['x\u202Egnp.exe', 'xU+202Egnp.exe'], ['\u2066\u2069', 'U+2066U+2069'],
-    ['\u200b\ufeff', 'U+200BU+FEFF'], ['\u{e0041}', 'U+E0041'], ['\ud800', 'U+D800'], ['one\ntwo\t', 'one↵two⇥'], ['a\r\nb\rc', 'a↵bU+000Dc'], ['\u2028', 'U+2028']]) {
+           ['a\u0000b', 'aU+0000b'], ['\u001b[31m', 'U+001B[31m'], ['\u0085', 'U+0085'],
+           ['x\u202Egnp.exe', 'xU+202Egnp.exe'], ['\u2066\u2069', 'U+2066U+2069'], ['\u200b\ufeff', 'U+200BU+FEFF'],
+           ['\u{e0041}', 'U+E0041'], ['\ud800', 'U+D800'], ['one\ntwo\t', 'one↵two⇥'], ['a\r\nb\rc', 'a↵bU+000Dc'],
+           ['\u2028', 'U+2028']]) {
     assert.equal(visible(text), shown);
     assert.equal(hasSpecial(text), true, shown);
   }
@@ -26,22 +29,27 @@ test('characters that hide, control or turn are shown as signs, all others as th
 
 test('cells read as their column says, and as they are when they are of another type', () => {
   for (const [value, type, text] of [
-    [null, 'text', ''], [undefined, 'text', ''], [true, 'flag', 'yes'], [false, 'flag', 'no'], [12345, 'number', '12345'], [0, 'number', '0'], [0, 'bytes', '0 B'],
-    [Date.UTC(2026, 0, 31, 10, 11, 12), 'time', '2026-01-31 10:11:12'], ['later', 'time', 'later'], [1e300, 'time', '1e+300'], [-1, 'time', '1969-12-31 23:59:59'],
-    ['many', 'bytes', 'many'], [{a: 1}, 'text', '{"a":1}']]) assert.equal(formatCell(value, type), text);
+           [null, 'text', ''], [undefined, 'text', ''], [true, 'flag', 'yes'], [false, 'flag', 'no'],
+           [12345, 'number', '12345'], [0, 'number', '0'], [0, 'bytes', '0 B'],
+           [Date.UTC(2026, 0, 31, 10, 11, 12), 'time', '2026-01-31 10:11:12'], ['later', 'time', 'later'],
+           [1e300, 'time', '1e+300'], [-1, 'time', '1969-12-31 23:59:59'], ['many', 'bytes', 'many'],
+           [{a: 1}, 'text', '{"a":1}']])
+    assert.equal(formatCell(value, type), text);
   assert.equal(formatTime(NaN), 'NaN');
-  for (const [bytes, text] of [[1023, '1023 B'], [1024, '1.00 KiB'], [10 * 1024, '10.0 KiB'], [2 ** 60, '1024.0 PiB'], [-2048, '-2.00 KiB'], [Infinity, 'Infinity']]) {
+  for (const [bytes, text] of [
+           [1023, '1023 B'], [1024, '1.00 KiB'], [10 * 1024, '10.0 KiB'], [2 ** 60, '1024.0 PiB'], [-2048, '-2.00 KiB'],
+           [Infinity, 'Infinity']]) {
     assert.equal(formatBytes(bytes), text);
   }
 });
 
 test('a tree stands depth first; parents that do not exist or run in a circle make roots', () => {
   for (const [parents, order, depths] of [
-    [[null, 0, 0, 1], [0, 1, 3, 2], [0, 1, 1, 2]],
-    [[2, 0, null], [2, 0, 1], [1, 2, 0]],
-    [[5, -1, 'x', 1.5, NaN], [0, 1, 2, 3, 4], [0, 0, 0, 0, 0]],
-    [[0], [0], [0]],
-    [[], [], []],
+           [[null, 0, 0, 1], [0, 1, 3, 2], [0, 1, 1, 2]],
+           [[2, 0, null], [2, 0, 1], [1, 2, 0]],
+           [[5, -1, 'x', 1.5, NaN], [0, 1, 2, 3, 4], [0, 0, 0, 0, 0]],
+           [[0], [0], [0]],
+           [[], [], []],
   ]) {
     const tree = layOut(parents);
     assert.deepEqual(tree.order, order);
@@ -75,34 +83,49 @@ test('values sort as people count, missing ones first, equal ones alike', () => 
 });
 
 test('events are counted in bins of a usual width, none lost and none twice', () => {
-  assert.deepEqual([[0, 60e3], [0, 3600e3], [0, 7 * 86400e3], [0, 1e14]].map(([from, to]) => binWidth(from, to)), [1000, 30e3, 2 * 3600e3, 1e14 / 140]);
-  const rows = [[5000, 'Error'], [1000, 'Warning'], [null, 'Error'], [1999, 'error'], ['odd', 'Error'], [2000, 'Verbose']];
+  assert.deepEqual(
+      [[0, 60e3], [0, 3600e3], [0, 7 * 86400e3], [0, 1e14]].map(([from, to]) => binWidth(from, to)),
+      [1000, 30e3, 2 * 3600e3, 1e14 / 140]);
+  const rows =
+      [[5000, 'Error'], [1000, 'Warning'], [null, 'Error'], [1999, 'error'], ['odd', 'Error'], [2000, 'Verbose']];
   const events = readEvents(rows, 0, 1);
   assert.deepEqual([...events.times], [1000, 1999, 2000, 5000]);
   const {starts, counts} = countBins(events, 1000, 5000);
   assert.deepEqual(starts, [1000, 2000, 3000, 4000, 5000]);
-  assert.deepEqual(counts.map((bins) => [...bins]), [[0, 0, 0, 0, 0], [1, 0, 0, 0, 1], [1, 0, 0, 0, 0], [0, 0, 0, 0, 0], [0, 1, 0, 0, 0]]);
+  assert.deepEqual(
+      counts.map((bins) => [...bins]),
+      [[0, 0, 0, 0, 0], [1, 0, 0, 0, 1], [1, 0, 0, 0, 0], [0, 0, 0, 0, 0], [0, 1, 0, 0, 0]]);
   assert.equal(readEvents([[null]], 0, 1), null);
   assert.deepEqual([0, 1, 1.5, 4].map((time) => lowerBound([1, 1, 2, 3], time)), [0, 0, 2, 4]);
 });
 
 test('words of a search, severities, addresses', () => {
-  for (const [query, words] of [['', []], ['  Disk  Full ', ['disk', 'full']], ['"Access denied" x', ['access denied', 'x']], ['"open', ['open']], ['""', []]]) {
+  for (const [query, words] of [
+           ['', []], ['  Disk  Full ', ['disk', 'full']], ['"Access denied" x', ['access denied', 'x']],
+           ['"open', ['open']], ['""', []]]) {
     assert.deepEqual(wordsOf(query), words);
   }
-  for (const [text, severity] of [['ERROR', 'error'], [' Info ', 'information'], ['Audit Failure', 'error'], ['constructor', 'other'], [null, 'other'], [3, 'other']]) {
+  for (const [text, severity] of [
+           ['ERROR', 'error'], [' Info ', 'information'], ['Audit Failure', 'error'], ['constructor', 'other'],
+           [null, 'other'], [3, 'other']]) {
     assert.equal(severityOf(text), severity);
   }
-  for (const [hash, id, row] of [['', 'overview', null], ['#events', 'events', null], ['#events/12', 'events', 12], ['#a%20b/0', 'a b', 0], ['#%', 'overview', null], ['#x/y/1', 'overview', null]]) {
+  for (const [hash, id, row] of [
+           ['', 'overview', null], ['#events', 'events', null], ['#events/12', 'events', 12], ['#a%20b/0', 'a b', 0],
+           ['#%', 'overview', null], ['#x/y/1', 'overview', null]]) {
     assert.deepEqual(readHash(hash), {id, row});
   }
 });
 
 test('a search looks through all tables, the one in view first, and a later one ends it', async () => {
   const table = (id, rows) => ({id, columns: [{type: 'text'}, {type: 'bytes'}], rows});
-  const tables = [table('one', [['Alpha', 1024], ['beta', null]]), table('two', Array.from({length: 5000}, (_, row) => [`Row ${row}`, row]))];
+  const tables = [
+    table('one', [['Alpha', 1024], ['beta', null]]),
+    table('two', Array.from({length: 5000}, (_, row) => [`Row ${row}`, row]))
+  ];
   const results = [];
-  const search = new Search(tables, ({id}, matches, count) => results.push([id, count, matches && [...matches].indexOf(1)]));
+  const search =
+      new Search(tables, ({id}, matches, count) => results.push([id, count, matches && [...matches].indexOf(1)]));
   assert.equal(await search.run('row 4999', tables[1]), true);
   assert.deepEqual(results.splice(0), [['two', 1, 4999], ['one', 0, -1]]);
   await search.run('1.00 kib alp', null);
@@ -112,7 +135,9 @@ test('a search looks through all tables, the one in view first, and a later one 
 });
 
 test('a data document that lacks everything makes an empty report, not an error', () => {
-  for (const data of [{}, {tables: null, findings: 3, timeline: {table: 'none'}}, {tables: [{id: 'x', columns: [], rows: [null, 1]}], timeline: {table: 'x', time: 'no'}}]) {
+  for (const data
+           of [{}, {tables: null, findings: 3, timeline: {table: 'none'}},
+               {tables: [{id: 'x', columns: [], rows: [null, 1]}], timeline: {table: 'x', time: 'no'}}]) {
     const report = complete(data);
     assert.deepEqual([report.user, report.findings, report.timeline], [[], [], null]);
   }

@@ -2,8 +2,14 @@
 export const kSeverities = ['critical', 'error', 'warning', 'information', 'other'];
 
 const kNames = new Map([
-  ['critical', 'critical'], ['error', 'error'], ['failure audit', 'error'], ['audit failure', 'error'], ['warning', 'warning'],
-  ['info', 'information'], ['information', 'information'], ['informational', 'information'],
+  ['critical', 'critical'],
+  ['error', 'error'],
+  ['failure audit', 'error'],
+  ['audit failure', 'error'],
+  ['warning', 'warning'],
+  ['info', 'information'],
+  ['information', 'information'],
+  ['informational', 'information'],
 ]);
 
 export function severityOf(text) {

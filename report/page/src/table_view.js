@@ -5,7 +5,7 @@ import {formatCell, formatCount, formatTime, plural} from './format.js';
 
 export class TableView {
   #table;
-  #findings;        // row index -> titles of the findings that rest on it
+  #findings; // row index -> titles of the findings that rest on it
   #host;
   #severity;
   #onClearSearch;
@@ -26,22 +26,40 @@ export class TableView {
     this.top = element('div', {class: 'above'});
   }
 
-  get table() { return this.#table; }
+  get table() {
+    return this.#table;
+  }
 
   show() {
     this.#host.hidden = false;
     if (this.#grid) return;
     this.#host.append(
-      element('div', {class: 'heading'}, element('h2', {}, foreign(this.#table.title ?? this.#table.id)), this.#count, this.#limits), this.top,
-      element('div', {class: 'body'}, this.#gridHost, this.#details));
+      element(
+        'div',
+        {class: 'heading'},
+        element('h2', {}, foreign(this.#table.title ?? this.#table.id)),
+        this.#count,
+        this.#limits,
+      ),
+      this.top,
+      element('div', {class: 'body'}, this.#gridHost, this.#details),
+    );
     this.#grid = new Grid(this.#table, this.#gridHost, {
-      cited: this.#findings, severity: this.#severity, onRow: (index) => this.#showDetails(index), onShown: (shown) => this.#describe(shown)});
+      cited: this.#findings,
+      severity: this.#severity,
+      onRow: (index, chosen) => {
+        if (chosen || !this.#details.hidden) this.#showDetails(index);
+      },
+      onShown: (shown) => this.#describe(shown),
+    });
     if (this.#matches) this.#grid.setMatches(this.#matches);
     if (this.#interval) this.#grid.setInterval(this.#interval);
     this.#describe(this.#grid.shown);
   }
 
-  hide() { this.#host.hidden = true; }
+  hide() {
+    this.#host.hidden = true;
+  }
 
   setMatches(matches) {
     if (matches === null && this.#matches === null) return;
@@ -79,22 +97,44 @@ export class TableView {
   #describe(shown) {
     const all = this.#table.rows.length;
     this.#count.textContent = shown === all ? plural(all, 'row') : `${formatCount(shown)} of ${plural(all, 'row')}`;
-    this.#limits.replaceChildren();
-    if (!this.#interval) return;
-    this.#limits.append(element('button', {type: 'button', class: 'chip', onclick: () => this.setInterval(null)},
-      `${formatTime(this.#interval.from)} to ${formatTime(this.#interval.to)} ✕`));
+    const chip = (text, remove) =>
+      element('button', {type: 'button', class: 'chip', title: 'Remove this limit', onclick: remove}, `${text} ✕`);
+    this.#limits.replaceChildren(
+      ...[
+        this.#interval &&
+          chip(`${formatTime(this.#interval.from)} to ${formatTime(this.#interval.to)}`, () => this.setInterval(null)),
+        this.#grid?.filtered && chip('Column filters', () => this.#grid.clearFilters()),
+      ].filter(Boolean),
+    );
   }
 
   #showDetails(index) {
     const cells = this.#table.rows[index];
     const entries = this.#table.columns.flatMap((column, at) => {
       const text = formatCell(cells[at], column.type);
-      return text === '' || at === this.#table.parent ? [] : [element('dt', {}, foreign(column.title ?? column.id)), element('dd', {}, foreign(text, {lines: true}))];
+      return text === '' || at === this.#table.parent
+        ? []
+        : [element('dt', {}, foreign(column.title ?? column.id)), element('dd', {}, foreign(text, {lines: true}))];
     });
     const titles = this.#findings.get(index) ?? [];
-    const close = element('button', {type: 'button', class: 'close', 'aria-label': 'Close the details', onclick: () => { this.#details.hidden = true; }}, '✕');
-    this.#details.replaceChildren(close, element('h3', {}, `Row ${formatCount(index + 1)}`),
-      ...titles.map((title) => element('p', {class: 'finding-title'}, 'Evidence of: ', foreign(title))), element('dl', {}, ...entries));
+    const close = element(
+      'button',
+      {
+        type: 'button',
+        class: 'close',
+        'aria-label': 'Close the details',
+        onclick: () => {
+          this.#details.hidden = true;
+        },
+      },
+      '✕',
+    );
+    this.#details.replaceChildren(
+      close,
+      element('h3', {}, `Row ${formatCount(index + 1)}`),
+      ...titles.map((title) => element('p', {class: 'finding-title'}, 'Evidence of: ', foreign(title))),
+      element('dl', {}, ...entries),
+    );
     this.#details.hidden = false;
   }
 }

@@ -1,8 +1,15 @@
 // Texts of a package as they are shown. Whatever a package holds may have been made by an attacker: characters that are
 // invisible, move the cursor or turn the direction of writing are replaced by a visible sign.
 
-const kSpecial =
-  /\r\n|[\u0000-\u001f\u007f-\u009f\u00ad\u034f\u061c\u115f\u1160\u17b4\u17b5\u180b-\u180f\u200b-\u200f\u2028-\u202e\u2060-\u206f\u3164\ufeff\uffa0\ufff0-\ufffb\ud800-\udfff]|[\u{e0000}-\u{e0fff}]/gu;
+const kRanges = [
+  '\\u0000-\\u001f\\u007f-\\u009f', // controls
+  '\\u00ad\\u034f\\u115f\\u1160\\u17b4\\u17b5\\u180b-\\u180f\\u200b-\\u200d', // invisible
+  '\\u2060-\\u2065\\u3164\\ufeff\\uffa0',
+  '\\u061c\\u200e\\u200f\\u202a-\\u202e\\u2066-\\u206f', // turn the direction
+  '\\u2028\\u2029', // end a line
+  '\\ufff0-\\ufffb\\ud800-\\udfff\\u{e0000}-\\u{e0fff}', // no characters of their own
+];
+const kSpecial = new RegExp(`\\r\\n|[${kRanges.join('')}]`, 'gu');
 
 export function hasSpecial(text) {
   kSpecial.lastIndex = 0;

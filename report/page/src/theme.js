@@ -1,4 +1,5 @@
-// Light and dark: as the system says, until the button says otherwise. The choice is kept where the browser lets a file keep one.
+// Light and dark: as the system says, until the button says otherwise. The choice is kept where the browser lets a file
+// keep one.
 const kKey = 'support-report-theme';
 const dark = matchMedia('(prefers-color-scheme: dark)');
 
@@ -42,10 +43,12 @@ export function startTheme(button, onChange) {
 // The colours of the style sheet, for what is drawn on a canvas.
 export function colours(names) {
   const probe = document.body.appendChild(document.createElement('i'));
-  const found = Object.fromEntries(names.map((name) => {
-    probe.style.color = `var(--${name})`;
-    return [name, getComputedStyle(probe).color];
-  }));
+  const found = Object.fromEntries(
+    names.map((name) => {
+      probe.style.color = `var(--${name})`;
+      return [name, getComputedStyle(probe).color];
+    }),
+  );
   probe.remove();
   return found;
 }

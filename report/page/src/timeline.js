@@ -1,6 +1,14 @@
-// The events over time: stacked bars by severity, the reproduction interval marked, zoom, and a click that chooses a time.
+// The events over time: stacked bars by severity, the reproduction interval marked, zoom, and a click that chooses a
+// time.
 import {BarChart} from 'echarts/charts';
-import {AriaComponent, DataZoomInsideComponent, DataZoomSliderComponent, GridComponent, MarkAreaComponent, TooltipComponent} from 'echarts/components';
+import {
+  AriaComponent,
+  DataZoomInsideComponent,
+  DataZoomSliderComponent,
+  GridComponent,
+  MarkAreaComponent,
+  TooltipComponent,
+} from 'echarts/components';
 import {init, use} from 'echarts/core';
 import {CanvasRenderer} from 'echarts/renderers';
 import {binWidth, countBins, readEvents} from './histogram.js';
@@ -9,18 +17,34 @@ import {element} from './dom.js';
 import {formatTime, plural} from './format.js';
 import {kSeverities} from './severity.js';
 
-use([BarChart, CanvasRenderer, GridComponent, TooltipComponent, DataZoomInsideComponent, DataZoomSliderComponent, MarkAreaComponent, AriaComponent]);
+use([
+  BarChart,
+  CanvasRenderer,
+  GridComponent,
+  TooltipComponent,
+  DataZoomInsideComponent,
+  DataZoomSliderComponent,
+  MarkAreaComponent,
+  AriaComponent,
+]);
 
-const kNarrowestView = 20000;  // milliseconds
+const kNarrowestView = 20000; // milliseconds
 const kDrawn = ['text', 'quiet', 'line', 'accent', 'interval', ...kSeverities, 'information-fill'];
 
-const kTimeLabels = {year: '{yyyy}', month: '{yyyy}-{MM}', day: '{MM}-{dd}', hour: '{HH}:{mm}', minute: '{HH}:{mm}', second: '{HH}:{mm}:{ss}'};
+const kTimeLabels = {
+  year: '{yyyy}',
+  month: '{yyyy}-{MM}',
+  day: '{MM}-{dd}',
+  hour: '{HH}:{mm}',
+  minute: '{HH}:{mm}',
+  second: '{HH}:{mm}:{ss}',
+};
 
 export class Timeline {
   #events;
   #interval;
   #chart;
-  #view;      // {from, to}: what is in view
+  #view; // {from, to}: what is in view
   #bins;
   #legend = element('ul', {class: 'legend', 'aria-label': 'Events in view by severity'});
   #range = element('p', {class: 'range', 'aria-live': 'polite'});
@@ -36,8 +60,20 @@ export class Timeline {
       return;
     }
     this.#view = this.#whole();
-    this.element.append(this.#buttons(onSelect), this.#canvas, element('div', {class: 'below'}, this.#legend,
-      element('p', {class: 'hint quiet'}, 'A click shows the events of that time. Ctrl and wheel, or the slider, zoom.')));
+    this.element.append(
+      this.#buttons(onSelect),
+      this.#canvas,
+      element(
+        'div',
+        {class: 'below'},
+        this.#legend,
+        element(
+          'p',
+          {class: 'hint quiet'},
+          'A click shows the events of that time. Ctrl and wheel, or the slider, zoom.',
+        ),
+      ),
+    );
     this.onSelect = onSelect;
   }
 
@@ -45,7 +81,8 @@ export class Timeline {
   showIn(host) {
     host.append(this.element);
     if (!this.#events) return;
-    if (!this.#chart) this.#start();
+    if (this.#chart) this.redraw();
+    else this.#start();
   }
 
   // After the colours or the width have changed.
@@ -75,10 +112,13 @@ export class Timeline {
     this.#chart.getZr().on('click', ({offsetX, offsetY}) => {
       if (!this.#chart.containPixel('grid', [offsetX, offsetY])) return;
       const [time] = this.#chart.convertFromPixel('grid', [offsetX, offsetY]);
-      const from = Math.floor((time - this.#bins.starts[0]) / this.#bins.width) * this.#bins.width + this.#bins.starts[0];
+      const from =
+        Math.floor((time - this.#bins.starts[0]) / this.#bins.width) * this.#bins.width + this.#bins.starts[0];
       this.onSelect(from, from + this.#bins.width);
     });
-    new ResizeObserver(() => { if (this.#canvas.offsetWidth > 0) this.#chart.resize(); }).observe(this.#canvas);
+    new ResizeObserver(() => {
+      if (this.#canvas.offsetWidth > 0) this.#chart.resize();
+    }).observe(this.#canvas);
   }
 
   // Of the events and of the reproduction, with some room.
@@ -96,15 +136,32 @@ export class Timeline {
       const [middle, half] = [(from + to) / 2, ((to - from) / 2) * factor];
       this.zoomTo(middle - half, middle + half);
     };
-    const move = (part) => this.zoomTo(this.#view.from + (this.#view.to - this.#view.from) * part, this.#view.to + (this.#view.to - this.#view.from) * part);
-    const interval = this.#interval && button('Reproduction', () => {
-      const room = (this.#interval.to - this.#interval.from) * 0.25;
-      this.zoomTo(this.#interval.from - room, this.#interval.to + room);
-    });
-    return element('div', {class: 'toolbar', role: 'group', 'aria-label': 'Time in view'},
-      button('Earlier', () => move(-0.5)), button('Later', () => move(0.5)), button('Zoom in', () => zoom(0.5)), button('Zoom out', () => zoom(2)),
-      button('All', () => { const {from, to} = this.#whole(); this.zoomTo(from, to); }), interval,
-      button('Show these events', () => onSelect(this.#view.from, this.#view.to)), this.#range);
+    const move = (part) =>
+      this.zoomTo(
+        this.#view.from + (this.#view.to - this.#view.from) * part,
+        this.#view.to + (this.#view.to - this.#view.from) * part,
+      );
+    const interval =
+      this.#interval &&
+      button('Reproduction', () => {
+        const room = (this.#interval.to - this.#interval.from) * 0.25;
+        this.zoomTo(this.#interval.from - room, this.#interval.to + room);
+      });
+    return element(
+      'div',
+      {class: 'toolbar', role: 'group', 'aria-label': 'Time in view'},
+      button('Earlier', () => move(-0.5)),
+      button('Later', () => move(0.5)),
+      button('Zoom in', () => zoom(0.5)),
+      button('Zoom out', () => zoom(2)),
+      button('All', () => {
+        const {from, to} = this.#whole();
+        this.zoomTo(from, to);
+      }),
+      interval,
+      button('Show these events', () => onSelect(this.#view.from, this.#view.to)),
+      this.#range,
+    );
   }
 
   #draw() {
@@ -115,15 +172,53 @@ export class Timeline {
       animation: false,
       useUTC: true,
       textStyle: {fontFamily: font, color: colour.text},
-            aria: {enabled: true, label: {description: 'Events over time by severity. The list below holds the counts.'}},
+      aria: {enabled: true, label: {description: 'Events over time by severity. The list below holds the counts.'}},
       grid: {left: 46, right: 44, top: 22, bottom: 58},
-      tooltip: {trigger: 'axis', renderMode: 'richText', axisPointer: {type: 'shadow', snap: true}, formatter: (series) => this.#tip(series)},
-      xAxis: {type: 'time', min: from, max: to, axisLabel: {color: colour.quiet, hideOverlap: true, formatter: kTimeLabels}, axisLine: {lineStyle: {color: colour.line}}, splitLine: {show: false}},
-      yAxis: {type: 'value', minInterval: 1, axisLabel: {color: colour.quiet}, splitLine: {lineStyle: {color: colour.line}}},
+      tooltip: {
+        trigger: 'axis',
+        renderMode: 'richText',
+        axisPointer: {type: 'shadow', snap: true},
+        formatter: (series) => this.#tip(series),
+      },
+      xAxis: {
+        type: 'time',
+        min: from,
+        max: to,
+        axisLabel: {color: colour.quiet, hideOverlap: true, formatter: kTimeLabels},
+        axisLine: {lineStyle: {color: colour.line}},
+        splitLine: {show: false},
+      },
+      yAxis: {
+        type: 'value',
+        minInterval: 1,
+        axisLabel: {color: colour.quiet},
+        splitLine: {lineStyle: {color: colour.line}},
+      },
       dataZoom: [
-        {type: 'inside', zoomOnMouseWheel: 'ctrl', filterMode: 'none', startValue: this.#view.from, endValue: this.#view.to, minValueSpan: kNarrowestView},
-        {type: 'slider', filterMode: 'none', startValue: this.#view.from, endValue: this.#view.to, minValueSpan: kNarrowestView, height: 18, bottom: 8,
-          showDataShadow: false, brushSelect: true, moveHandleSize: 4, borderColor: colour.line, fillerColor: colour.interval, labelFormatter: formatTime, textStyle: {color: colour.quiet}},
+        {
+          type: 'inside',
+          zoomOnMouseWheel: 'ctrl',
+          filterMode: 'none',
+          startValue: this.#view.from,
+          endValue: this.#view.to,
+          minValueSpan: kNarrowestView,
+        },
+        {
+          type: 'slider',
+          filterMode: 'none',
+          startValue: this.#view.from,
+          endValue: this.#view.to,
+          minValueSpan: kNarrowestView,
+          height: 18,
+          bottom: 8,
+          showDataShadow: false,
+          brushSelect: true,
+          moveHandleSize: 4,
+          borderColor: colour.line,
+          fillerColor: colour.interval,
+          labelFormatter: formatTime,
+          textStyle: {color: colour.quiet},
+        },
       ],
     });
     this.#drawBins(colour);
@@ -132,13 +227,25 @@ export class Timeline {
   #drawBins(colour = colours(kDrawn)) {
     this.#bins = countBins(this.#events, this.#view.from, this.#view.to);
     const {starts, width, counts} = this.#bins;
-    const series = kSeverities.map((name, at) => ({
-      name, type: 'bar', stack: 'events', barCategoryGap: '12%', itemStyle: {color: colour[`${name}-fill`] ?? colour[name]}, cursor: 'pointer', large: false,
-      data: starts.map((start, bin) => [start + width / 2, counts[at][bin]]),
-    })).reverse();
+    const series = kSeverities
+      .map((name, at) => ({
+        name,
+        type: 'bar',
+        stack: 'events',
+        barCategoryGap: '12%',
+        itemStyle: {color: colour[`${name}-fill`] ?? colour[name]},
+        cursor: 'pointer',
+        large: false,
+        data: starts.map((start, bin) => [start + width / 2, counts[at][bin]]),
+      }))
+      .reverse();
     if (this.#interval) {
-      series[0].markArea = {silent: true, itemStyle: {color: colour.interval, borderColor: colour.accent, borderWidth: 1}, label: {color: colour.accent, position: 'top', distance: 3},
-        data: [[{name: 'Reproduction', xAxis: this.#interval.from}, {xAxis: this.#interval.to}]]};
+      series[0].markArea = {
+        silent: true,
+        itemStyle: {color: colour.interval, borderColor: colour.accent, borderWidth: 1},
+        label: {color: colour.accent, position: 'top', distance: 3},
+        data: [[{name: 'Reproduction', xAxis: this.#interval.from}, {xAxis: this.#interval.to}]],
+      };
     }
     this.#chart.setOption({series});
     this.#describe();
@@ -146,14 +253,22 @@ export class Timeline {
 
   #describe() {
     const totals = this.#bins.counts.map((bins) => bins.reduce((sum, count) => sum + count, 0));
-    this.#legend.replaceChildren(...kSeverities.flatMap((name, at) => (totals[at] === 0 ? [] :
-      element('li', {class: `severity ${name}`}, `${name}: ${totals[at].toLocaleString('en')}`))));
+    this.#legend.replaceChildren(
+      ...kSeverities.flatMap((name, at) =>
+        totals[at] === 0
+          ? []
+          : element('li', {class: `severity ${name}`}, `${name}: ${totals[at].toLocaleString('en')}`),
+      ),
+    );
     this.#range.textContent = `${formatTime(this.#view.from)} to ${formatTime(this.#view.to)}`;
   }
 
   #tip(series) {
     const bin = series[0].dataIndex;
-    const lines = series.filter(({value}) => value[1] > 0).map(({seriesName, value}) => `${seriesName}: ${value[1].toLocaleString('en')}`).reverse();
+    const lines = series
+      .filter(({value}) => value[1] > 0)
+      .map(({seriesName, value}) => `${seriesName}: ${value[1].toLocaleString('en')}`)
+      .reverse();
     return [formatTime(this.#bins.starts[bin]), ...(lines.length > 0 ? lines : [plural(0, 'event')])].join('\n');
   }
 }

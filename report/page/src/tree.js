@@ -7,9 +7,14 @@ export function layOut(parents) {
   const isRow = (index) => Number.isInteger(index) && index >= 0 && index < parents.length;
   const tree = {
     parent: Int32Array.from(parents, (parent, row) => (isRow(parent) && parent !== row ? parent : -1)),
-    depth: new Uint32Array(parents.length), order: [], hasChildren: new Uint8Array(parents.length)};
+    depth: new Uint32Array(parents.length),
+    order: [],
+    hasChildren: new Uint8Array(parents.length),
+  };
   breakCycles(tree.parent);
-  tree.parent.forEach((parent, row) => { if (parent >= 0) children[parent].push(row); });
+  tree.parent.forEach((parent, row) => {
+    if (parent >= 0) children[parent].push(row);
+  });
   const pending = [];
   for (let row = parents.length - 1; row >= 0; --row) if (tree.parent[row] < 0) pending.push(row);
   while (pending.length > 0) {
@@ -25,7 +30,7 @@ export function layOut(parents) {
 }
 
 function breakCycles(parent) {
-  const state = new Uint8Array(parent.length);  // 1: on the present path, 2: known to end at a root
+  const state = new Uint8Array(parent.length); // 1: on the present path, 2: known to end at a root
   for (let start = 0; start < parent.length; ++start) {
     const path = [];
     let row = start;
@@ -59,7 +64,8 @@ export function withAncestors(tree, matches) {
   return shown;
 }
 
-// Sorted rows brought back into the shape of the tree: siblings keep their order, below the nearest ancestor among the rows.
+// Sorted rows brought back into the shape of the tree: siblings keep their order, below the nearest ancestor among the
+// rows.
 export function regroup(tree, sorted) {
   const present = new Uint8Array(tree.parent.length);
   for (const row of sorted) present[row] = 1;
