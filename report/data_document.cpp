@@ -4,9 +4,9 @@
 
 #include "core/json.h"
 #include "report/evidence_rows.h"
+#include "report/findings_output.h"
 #include "report/json_access.h"
 #include "report/overview.h"
-#include "report/rules.h"
 
 namespace report {
 namespace {
@@ -61,19 +61,12 @@ Json::Value FindingsMember(const std::vector<Finding>& findings, const std::vect
   EvidenceRows rows(tables);
   Json::Value list(Json::arrayValue);
   for (const Finding& finding : findings) {
-    Json::Value& entry = list.append(Json::Value(Json::objectValue));
-    entry["id"] = finding.rule->id;
-    entry["severity"] = SeverityName(finding.rule->severity);
-    entry["title"] = finding.rule->title;
-    entry["explanation"] = finding.rule->explanation;
-    entry["count"] = Json::UInt64{finding.evidence.Count()};
-    Json::Value& shown = entry["evidence"] = Json::Value(Json::arrayValue);
-    for (const Evidence& evidence : finding.evidence.Kept()) {
-      const EvidenceRow found = rows.Find(evidence);
-      Json::Value& item = shown.append(Json::Value(Json::objectValue));
-      item["file"] = Shortened(evidence.file, kLongestCell);
-      item["path"] = Shortened(evidence.path, kLongestCell);
-      item["text"] = Shortened(evidence.text, kLongestCell);
+    Json::Value& entry = list.append(FindingAsJson(finding));
+    for (Json::ArrayIndex i = 0; i < entry["evidence"].size(); ++i) {
+      const EvidenceRow found = rows.Find(finding.evidence.Kept()[i]);
+      Json::Value& item = entry["evidence"][i];
+      for (Json::Value& text : item)
+        text = TextCell(text);
       item["table"] = found.table != nullptr ? Json::Value(found.table->id) : Json::Value();
       item["row"] = found.row ? Json::Value(Json::UInt64{*found.row}) : Json::Value();
     }

@@ -98,24 +98,28 @@ std::string FindingsAsText(const std::vector<Finding>& findings, const Compariso
   return FindingListAsText(findings) + (comparison == nullptr ? "" : "\n" + ComparisonAsText(*comparison));
 }
 
+Json::Value FindingAsJson(const Finding& finding) {
+  Json::Value entry(Json::objectValue);
+  entry["id"] = finding.rule->id;
+  entry["severity"] = SeverityName(finding.rule->severity);
+  entry["title"] = finding.rule->title;
+  entry["explanation"] = finding.rule->explanation;
+  entry["count"] = Json::UInt64{finding.evidence.Count()};
+  Json::Value& shown = entry["evidence"] = Json::Value(Json::arrayValue);
+  for (const Evidence& evidence : finding.evidence.Kept()) {
+    Json::Value& item = shown.append(Json::Value(Json::objectValue));
+    item["file"] = ToUtf8(ToWide(evidence.file));
+    item["path"] = ToUtf8(ToWide(evidence.path));
+    item["text"] = ToUtf8(ToWide(evidence.text));
+  }
+  return entry;
+}
+
 std::string FindingsAsJson(const std::vector<Finding>& findings, const Comparison* comparison) {
   Json::Value document(Json::objectValue);
   Json::Value& list = document["findings"] = Json::Value(Json::arrayValue);
-  for (const Finding& finding : findings) {
-    Json::Value& entry = list.append(Json::Value(Json::objectValue));
-    entry["id"] = finding.rule->id;
-    entry["severity"] = SeverityName(finding.rule->severity);
-    entry["title"] = finding.rule->title;
-    entry["explanation"] = finding.rule->explanation;
-    entry["count"] = Json::UInt64{finding.evidence.Count()};
-    Json::Value& shown = entry["evidence"] = Json::Value(Json::arrayValue);
-    for (const Evidence& evidence : finding.evidence.Kept()) {
-      Json::Value& item = shown.append(Json::Value(Json::objectValue));
-      item["file"] = ToUtf8(ToWide(evidence.file));
-      item["path"] = ToUtf8(ToWide(evidence.path));
-      item["text"] = ToUtf8(ToWide(evidence.text));
-    }
-  }
+  for (const Finding& finding : findings)
+    list.append(FindingAsJson(finding));
   if (comparison != nullptr) document["comparison"] = ComparisonAsJson(*comparison);
   return WriteStyledJson(document);
 }

@@ -1,6 +1,8 @@
 // Findings as text for people and as JSON for scripts. UTF-8.
 #pragma once
 
+#include <json/value.h>
+
 #include <string>
 #include <string_view>
 #include <vector>
@@ -17,10 +19,13 @@ std::string Printable(std::string_view text);
 // Without a comparison, null, nothing is said of one.
 std::string FindingsAsText(const std::vector<Finding>& findings, const Comparison* comparison = nullptr);
 
-// {"findings": [{"id", "severity", "title", "explanation", "count", "evidence": [{"file", "path", "text"}]}]};
-// "count" is that of all evidence, of which the first 20 are shown.
-// With a comparison {"findings", "comparison": {"otherIsOlder", "otherTime", "warnings": [text], "count", "changes":
-// [{"kind", "table", "item", "field", "before", "after"}], "notCompared": [{"table", "why"}]}}.
+// {"id", "severity", "title", "explanation", "count", "evidence": [{"file", "path", "text"}]}; "count" is that of all
+// evidence, of which the first 20 are shown.
+Json::Value FindingAsJson(const Finding& finding);
+
+// {"findings": [as above]}, and with a comparison {"findings", "comparison": {"otherIsOlder", "otherTime", "warnings":
+// [text], "count", "changes": [{"kind", "table", "item", "field", "before", "after"}], "notCompared": [{"table",
+// "why"}]}}.
 std::string FindingsAsJson(const std::vector<Finding>& findings, const Comparison* comparison = nullptr);
 
 }  // namespace report

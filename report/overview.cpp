@@ -120,7 +120,7 @@ std::vector<LabelledText> MissingParts(const Collection& collection) {
 std::vector<Gauge> Gauges(const Collection& collection) {
   constexpr size_t kMost = 100;
   std::vector<Gauge> gauges;
-  const auto add = [&](std::string name, const Json::Value& total, const Json::Value& free, bool isMemory) {
+  const auto add = [&](const std::string& name, const Json::Value& total, const Json::Value& free, bool isMemory) {
     const auto all = NumberOf(total);
     const auto rest = NumberOf(free);
     if (!all || !rest || *all <= 0 || *rest < 0 || gauges.size() >= kMost) return;

@@ -14,7 +14,6 @@ namespace report {
 namespace {
 
 using testing::ElementsAre;
-using testing::Optional;
 
 const Table* TableNamed(const std::vector<Table>& tables, std::string_view id) {
   for (const Table& table : tables) {
