@@ -64,7 +64,7 @@ bool ClearOutputFolder(const std::wstring& folder) {
 int Collect(const std::shared_ptr<CollectingSettings>& settings, const std::wstring& folder,
             const std::atomic<bool>& cancel, const ProgressCallback& progress) {
   LOG_TRACE(kScope, L"--> COLLECT");
-  systeminfo::ManifestHeader header{ST_VERSION, systeminfo::CurrentTimeUtc(), {}};
+  systeminfo::ManifestHeader header{ST_VERSION, systeminfo::CurrentTimeUtc(), {}, 0};
   systeminfo::DataCollectorImpl collector(settings);
   const int result = collector.CollectAll(&cancel, [&progress](int step, int steps) {
     const double scaled = static_cast<double>(step) / steps * 0.5;
@@ -74,6 +74,7 @@ int Collect(const std::shared_ptr<CollectingSettings>& settings, const std::wstr
   LOG_TRACE(kScope, L"<-- COLLECT");
   if (result == systeminfo::kRunDone) {
     header.endUtc = systeminfo::CurrentTimeUtc();
+    header.utcOffsetMinutes = systeminfo::CurrentUtcOffset();
     systeminfo::WriteManifest(folder, header, collector.Outcomes());
   }
   return result;

@@ -18,6 +18,10 @@ bool ParseJson(std::string_view text, Json::Value& value, std::string& error);
 std::string WriteStyledJson(const Json::Value& value);   // indented by 3 spaces, right margin 74 columns
 std::string WriteCompactJson(const Json::Value& value);  // one line, ended by a newline
 
+// Adds a value without content of its own (null, text, a number or a truth value) as it stands in both layouts: ASCII
+// only, so that whatever follows it may be joined by hand.
+void AppendJsonScalar(std::string& out, const Json::Value& value);
+
 // The same for a document whose text is not to be held in memory. The sink gets the text piece by piece, each about 64
 // KiB (more when one string is longer), and ends the writing by returning false.
 using JsonSink = std::function<bool(std::string_view piece)>;

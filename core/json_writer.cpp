@@ -88,7 +88,9 @@ void AppendQuoted(std::string& out, std::string_view text) {
   out += '"';
 }
 
-void AppendScalar(std::string& out, const Json::Value& value) {
+}  // namespace
+
+void AppendJsonScalar(std::string& out, const Json::Value& value) {
   const char* begin = nullptr;
   const char* end = nullptr;
   switch (value.type()) {
@@ -115,6 +117,8 @@ void AppendScalar(std::string& out, const Json::Value& value) {
       break;
   }
 }
+
+namespace {
 
 bool IsFilledContainer(const Json::Value& value) {
   return (value.isArray() || value.isObject()) && !value.empty();
@@ -171,7 +175,7 @@ class JsonText {
     } else if (value.isObject()) {
       out += "{}";
     } else {
-      AppendScalar(out, value);
+      AppendJsonScalar(out, value);
     }
   }
 

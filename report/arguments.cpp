@@ -16,7 +16,10 @@ struct Switch {
   bool Arguments::*member;
 };
 
-constexpr TextOption kTextOptions[] = {{L"--key", &Arguments::keyFile}, {L"--extract", &Arguments::extractFolder}};
+constexpr TextOption kTextOptions[] = {{L"--key", &Arguments::keyFile},
+                                       {L"--extract", &Arguments::extractFolder},
+                                       {L"--compare", &Arguments::other},
+                                       {L"-o", &Arguments::reportFile}};
 constexpr Switch kSwitches[] = {
     {L"--json", &Arguments::asJson}, {L"--help", &Arguments::showHelp}, {L"--version", &Arguments::showVersion}};
 
@@ -54,14 +57,17 @@ std::string ParseArguments(const std::vector<std::wstring>& elements, Arguments&
 }
 
 std::string HelpText() {
-  return "usage: support_report PACKAGE [--key FILE] [--extract FOLDER] [--json]\n"
+  return "usage: support_report PACKAGE [--key FILE] [-o REPORT] [--compare OTHER] [--extract FOLDER] [--json]\n"
          "\n"
          "Opens a collection of the support tool and says what is wrong with the computer.\n"
          "\n"
          "  PACKAGE           an encrypted package, a zip archive, or a folder with an unpacked one\n"
          "  --key FILE        the private key that opens the package (PEM, \"RSA PRIVATE KEY\")\n"
+         "  -o REPORT         writes all that was collected, with the findings, as one HTML file, in place of the "
+         "text\n"
+         "  --compare OTHER   says too what changed since (or until) another collection of the same computer\n"
          "  --extract FOLDER  unpacks into FOLDER too, which must be new or empty\n"
-         "  --json            prints the findings as JSON\n"
+         "  --json            prints the findings and changes as JSON\n"
          "  --help            prints this text\n"
          "  --version         prints the version\n"
          "\n"

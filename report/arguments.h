@@ -10,6 +10,8 @@ struct Arguments {
   std::wstring input;
   std::wstring keyFile;        // empty: none
   std::wstring extractFolder;  // empty: nothing is unpacked
+  std::wstring other;          // a collection to compare with; empty: none
+  std::wstring reportFile;     // empty: no HTML report is written
   bool asJson = false;
   bool showHelp = false;
   bool showVersion = false;

@@ -1,6 +1,7 @@
 #include "report/collection.h"
 
 #include <algorithm>
+#include <cmath>
 #include <iterator>
 
 #include "core/json.h"
@@ -11,8 +12,9 @@ namespace report {
 namespace {
 
 constexpr std::string_view kDocumentNames[] = {
-    kManifestName, "installed_software", "product_information", "running_tasks", "services", "startup_programs",
-    "storage",     "system_drivers",     "system_summary",      "windows_events"};
+    kManifestName, "installed_software",  "installed_updates", "network",       "printers",         "processor",
+    "registry",    "product_information", "running_tasks",     "services",      "startup_programs", "storage",
+    "guiData",     "system_drivers",      "system_summary",    "windows_events"};
 
 }  // namespace
 
@@ -37,7 +39,14 @@ void AddDocument(Collection& collection, std::string_view name, std::string_view
 }
 
 void SetCollectionTime(Collection& collection) {
-  collection.collectedAt = TimeFromIso(TextOf(Member(collection.Document(kManifestName), "start")));
+  const Json::Value& manifest = collection.Document(kManifestName);
+  collection.collectedAt = TimeFromIso(TextOf(Member(manifest, "start")));
+  const auto minutes = NumberOf(Member(manifest, "utc_offset_minutes"));
+  if (minutes && std::abs(*minutes) <= kLocalTimeSlack / 60) {
+    collection.utcOffset = *minutes * 60;
+  } else {
+    collection.utcOffset = OffsetOfTimeZone(TextOf(Member(collection.Document("system_summary"), "Time Zone")));
+  }
 }
 
 }  // namespace report

@@ -50,8 +50,8 @@ void FindCollectorErrors(const Collection& collection, EvidenceList& found) {
 
 void FindMissingDocuments(const Collection& collection, EvidenceList& found) {
   std::set<std::string> names;
-  for (const std::string& path : collection.fileNames)
-    names.insert(std::string(FileNameOf(path)));
+  for (const PackageFile& file : collection.files)
+    names.insert(std::string(FileNameOf(file.name)));
   ForEachCollector(collection, [&](const Json::Value& collector, const std::string& path) {
     const std::string name = TextOf(Member(collector, "name"));
     // Dumps are a collector's only result that is no document.

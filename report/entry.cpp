@@ -31,12 +31,33 @@ void Write(DWORD stream, std::string_view utf8) {
   }
 }
 
+// One line on a terminal that each step replaces; nothing in a file or pipe.
+class ProgressLine {
+ public:
+  ProgressLine() {
+    DWORD mode = 0;
+    m_isShown = GetConsoleMode(GetStdHandle(STD_ERROR_HANDLE), &mode) != FALSE;
+  }
+  void Show(std::string_view step) const {
+    constexpr size_t kWidth = 40;
+    std::string line(step);
+    line.resize(kWidth, ' ');
+    if (m_isShown) Write(STD_ERROR_HANDLE, "\r" + line + "\r");
+  }
+
+ private:
+  bool m_isShown = false;
+};
+
 }  // namespace
 
 int wmain(int count, wchar_t** elements) {
   RestrictLibrarySearch();
+  const ProgressLine line;
   const report::ProgramOutput output =
-      report::RunProgram(std::vector<std::wstring>(elements + std::min(count, 1), elements + count));
+      report::RunProgram(std::vector<std::wstring>(elements + std::min(count, 1), elements + count),
+                         [&line](std::string_view step) { line.Show(step); });
+  line.Show("");
   Write(STD_OUTPUT_HANDLE, output.text);
   Write(STD_ERROR_HANDLE, output.messages);
   return static_cast<int>(output.code);

@@ -51,11 +51,7 @@ std::string TextsOf(const Json::Value& event) {
   ForEachElement(Member(event, "InsertionStrings"), [&](const Json::Value& text, const std::string&) {
     if (!TextOf(text).empty()) texts += (texts.empty() ? "" : " | ") + TextOf(text);
   });
-  if (texts.size() <= kMost) return texts;
-  size_t end = kMost;
-  while (end > 0 && (static_cast<unsigned char>(texts[end]) & 0xC0) == 0x80)  // not within a character
-    --end;
-  return texts.substr(0, end) + "...";
+  return Shortened(texts, kMost);
 }
 
 std::string Describe(const Json::Value& event) {

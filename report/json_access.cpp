@@ -27,6 +27,14 @@ std::optional<double> NumberOf(const Json::Value& value) {
   return static_cast<double>(number);
 }
 
+std::string Shortened(std::string_view text, size_t most) {
+  if (text.size() <= most) return std::string(text);
+  size_t end = most;
+  while (end > 0 && (static_cast<unsigned char>(text[end]) & 0xC0) == 0x80)
+    --end;
+  return std::string(text.substr(0, end)) + "...";
+}
+
 bool IsFalse(const Json::Value& value) {
   return value.isBool() && !value.asBool();
 }

@@ -6,6 +6,7 @@
 
 #include <optional>
 #include <string>
+#include <string_view>
 
 namespace report {
 
@@ -17,6 +18,9 @@ std::string TextOf(const Json::Value& value);
 
 // A finite JSON number, or a text that is a decimal whole number, as the collectors write 64-bit ones.
 std::optional<double> NumberOf(const Json::Value& value);
+
+// The text, or its beginning and "..." when it is longer than `most` bytes; never cut within a character.
+std::string Shortened(std::string_view text, size_t most);
 
 bool IsFalse(const Json::Value& value);  // the JSON value false only: neither null nor 0
 

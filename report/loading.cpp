@@ -19,7 +19,7 @@ std::string_view DocumentName(std::string_view path) {
   std::string_view name = FileNameOf(path);
   if (folder.find('/') != std::string_view::npos || !name.ends_with(kExtension)) return {};
   name.remove_suffix(kExtension.size());
-  return IsDocumentName(name) ? name : std::string_view();
+  return name;
 }
 
 // "collected\services.json" of a folder becomes "collected/services.json".
@@ -30,8 +30,8 @@ std::string EntryNameOf(std::wstring_view root, std::wstring_view path) {
   return name;
 }
 
-std::vector<SourceFile> ListFolder(const std::wstring& root, std::vector<Evidence>& leftOut) {
-  std::vector<SourceFile> files;
+std::vector<PackageFile> ListFolder(const std::wstring& root, std::vector<Evidence>& leftOut) {
+  std::vector<PackageFile> files;
   WalkDir(root, [&](const qx::PathString& path, const WIN32_FIND_DATAW& entry) {
     if ((entry.dwFileAttributes & FILE_ATTRIBUTE_DIRECTORY) != 0) return kWalkContinue;
     std::string name = EntryNameOf(root, path);
@@ -48,7 +48,7 @@ std::vector<SourceFile> ListFolder(const std::wstring& root, std::vector<Evidenc
   return files;
 }
 
-void LoadDocument(Collection& collection, const SourceFile& file, size_t index, const FileReader& read) {
+void LoadDocument(Collection& collection, const PackageFile& file, size_t index, const FileReader& read) {
   const std::string_view name = DocumentName(file.name);
   if (file.size > kLargestDocument) {
     collection.unreadable.push_back({std::string(name) + ".json", "", "is too large to be read"});
@@ -65,11 +65,11 @@ void LoadDocument(Collection& collection, const SourceFile& file, size_t index, 
 
 }  // namespace
 
-std::optional<std::string> CollectionFolder(const std::vector<std::string>& names) {
+std::optional<std::string> CollectionFolder(const std::vector<PackageFile>& files) {
   const std::string* any = nullptr;
-  for (const std::string& name : names) {
+  for (const auto& [name, size] : files) {
     const std::string_view document = DocumentName(name);
-    if (document.empty()) continue;
+    if (!IsDocumentName(document)) continue;
     if (any == nullptr || document == kManifestName) any = &name;
     if (document == kManifestName) break;
   }
@@ -77,23 +77,28 @@ std::optional<std::string> CollectionFolder(const std::vector<std::string>& name
   return any->substr(0, any->size() - FileNameOf(*any).size());
 }
 
-std::optional<Collection> LoadCollection(const std::vector<SourceFile>& files, const FileReader& read) {
+std::optional<Collection> LoadCollection(const std::vector<PackageFile>& files, const FileReader& read) {
   Collection collection;
-  for (const SourceFile& file : files)
-    collection.fileNames.push_back(file.name);
-  const auto folder = CollectionFolder(collection.fileNames);
+  collection.files = files;
+  const auto folder = CollectionFolder(files);
   if (!folder) return std::nullopt;
-  for (size_t i = 0; i < files.size(); ++i) {
-    const std::string& name = files[i].name;
-    const bool isInFolder = name.starts_with(*folder) && FileNameOf(name).size() + folder->size() == name.size();
-    if (isInFolder && !DocumentName(name).empty()) LoadDocument(collection, files[i], i, read);
+  size_t documents = 0;
+  // Those that the rules read come first, so that no number of others keeps them out.
+  for (const bool isOwn : {true, false}) {
+    for (size_t i = 0; i < files.size(); ++i) {
+      const std::string& name = files[i].name;
+      const std::string_view document = DocumentName(name);
+      const bool isInFolder = name.starts_with(*folder) && FileNameOf(name).size() + folder->size() == name.size();
+      if (!isInFolder || document.empty() || IsDocumentName(document) != isOwn) continue;
+      if (documents++ < kMostDocuments) LoadDocument(collection, files[i], i, read);
+    }
   }
   SetCollectionTime(collection);
   return collection;
 }
 
 std::optional<Collection> LoadCollection(const Archive& archive) {
-  std::vector<SourceFile> files;
+  std::vector<PackageFile> files;
   for (const ArchiveEntry& entry : archive.Entries())
     files.push_back({entry.name, entry.size});
   auto collection = LoadCollection(files, [&](size_t index, std::string& bytes, std::string& error) {
@@ -106,7 +111,7 @@ std::optional<Collection> LoadCollection(const Archive& archive) {
 std::optional<Collection> LoadCollection(std::wstring_view folder) {
   const std::wstring root(WithoutEndSeparators(folder));
   std::vector<Evidence> leftOut;
-  const std::vector<SourceFile> files = ListFolder(root, leftOut);
+  const std::vector<PackageFile> files = ListFolder(root, leftOut);
   auto collection = LoadCollection(files, [&](size_t index, std::string& bytes, std::string& error) {
     const DWORD code = ReadWholeFile(JoinPath(root, ToWide(files[index].name)), kLargestDocument, bytes);
     error = "cannot be read, error " + std::to_string(code);

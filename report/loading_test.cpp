@@ -16,11 +16,11 @@ using testing::SizeIs;
 constexpr char kManifest[] = R"({"start": "2024-03-04T12:00:00Z"})";
 
 TEST(Loading, TheCollectionsFolderIsThatOfTheManifest) {
-  EXPECT_THAT(CollectionFolder({"settings/services.json", "out put/collection_manifest.json"}),
+  EXPECT_THAT(CollectionFolder({{"settings/services.json"}, {"out put/collection_manifest.json"}}),
               Optional(std::string("out put/")));
-  EXPECT_THAT(CollectionFolder({"collection_manifest.json"}), Optional(std::string()));
-  EXPECT_THAT(CollectionFolder({"Logs/x.log", "collected/storage.json"}), Optional(std::string("collected/")));
-  EXPECT_EQ(CollectionFolder({"a/b/collection_manifest.json", "collected/unknown.json", "services.jsonx"}),
+  EXPECT_THAT(CollectionFolder({{"collection_manifest.json"}}), Optional(std::string()));
+  EXPECT_THAT(CollectionFolder({{"Logs/x.log"}, {"collected/storage.json"}}), Optional(std::string("collected/")));
+  EXPECT_EQ(CollectionFolder({{"a/b/collection_manifest.json"}, {"collected/unknown.json"}, {"services.jsonx"}}),
             std::nullopt);
   EXPECT_EQ(CollectionFolder({}), std::nullopt);
 }
@@ -44,7 +44,7 @@ TEST(Loading, AnArchivesDocumentsAndNamesAreThere) {
   EXPECT_THAT(collection->unreadable[0].text, HasSubstr("is no JSON document"));
   EXPECT_THAT(collection->unreadable[1].text, HasSubstr("cannot be unpacked"));
   EXPECT_THAT(collection->leftOut, ElementsAre(Evidence{"../x", "", "leads out of its folder"}));
-  EXPECT_THAT(collection->fileNames, SizeIs(5));
+  EXPECT_THAT(collection->files, SizeIs(5));
 }
 
 TEST(Loading, ADocumentThatIsTooLargeIsNotRead) {

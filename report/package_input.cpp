@@ -25,16 +25,17 @@ InputKind KindOfInput(std::string_view bytes) {
   return parts && parts->keyBlob.starts_with(kBlobHeader) ? InputKind::kPackage : InputKind::kUnknown;
 }
 
-ExitCode ReadArchiveBytes(const std::wstring& inputFile, const std::wstring& keyFile, std::string& archive,
+ExitCode ReadArchiveBytes(const std::wstring& inputFile, const std::wstring& keyFile, ArchiveInput& input,
                           std::string& message) {
   std::string bytes;
   if (const DWORD error = ReadWholeFile(inputFile, kLargestInput, bytes); error != ERROR_SUCCESS) {
     message = CannotRead(inputFile, error);
     return ExitCode::kBadInput;
   }
+  input.fileSize = bytes.size();
   const InputKind kind = KindOfInput(bytes);
   if (kind == InputKind::kArchive) {
-    archive = std::move(bytes);
+    input.archive = std::move(bytes);
     return ExitCode::kNothingFound;
   }
   if (kind == InputKind::kUnknown) {
@@ -50,13 +51,13 @@ ExitCode ReadArchiveBytes(const std::wstring& inputFile, const std::wstring& key
     message = CannotRead(keyFile, error);
     return ExitCode::kBadInput;
   }
-  if (const DWORD error = stutil::DecryptBuffer(key, bytes, archive); error != ERROR_SUCCESS) {
+  if (const DWORD error = stutil::DecryptBuffer(key, bytes, input.archive); error != ERROR_SUCCESS) {
     message = ToUtf8(keyFile) + " does not open the package, error " + std::to_string(error) +
               ". Name the private key (PEM, \"RSA PRIVATE KEY\") of the pair whose public key the support tool was "
               "built with.";
     return ExitCode::kWrongKey;
   }
-  if (KindOfInput(archive) != InputKind::kArchive) {
+  if (KindOfInput(input.archive) != InputKind::kArchive) {
     message = ToUtf8(inputFile) + " is damaged: what it holds is no zip archive. Ask for it again.";
     return ExitCode::kBadInput;
   }

@@ -18,9 +18,14 @@ inline constexpr uint64_t kLargestKeyFile = uint64_t{64} << 10;
 // By the first bytes alone.
 InputKind KindOfInput(std::string_view bytes);
 
+struct ArchiveInput {
+  std::string archive;
+  uint64_t fileSize = 0;  // of the file that was named, in bytes
+};
+
 // `keyFile` may be empty: none was named. On failure `message` says what is wrong and what to do; the code is
 // kBadInput, or kWrongKey for a package that the key does not open. Else kNothingFound.
-ExitCode ReadArchiveBytes(const std::wstring& inputFile, const std::wstring& keyFile, std::string& archive,
+ExitCode ReadArchiveBytes(const std::wstring& inputFile, const std::wstring& keyFile, ArchiveInput& input,
                           std::string& message);
 
 }  // namespace report

@@ -141,10 +141,10 @@ void FindOtherSecurityProducts(const Collection& collection, EvidenceList& found
 void FindCrashDumps(const Collection& collection, EvidenceList& found) {
   // Dumps that the collection made itself lie beside the manifest.
   std::string own;
-  for (const std::string& name : collection.fileNames) {
+  for (const auto& [name, size] : collection.files) {
     if (FileNameOf(name) == "collection_manifest.json") own = FolderOf(name);
   }
-  for (const std::string& name : collection.fileNames) {
+  for (const auto& [name, size] : collection.files) {
     if (LowerAscii(name).ends_with(".dmp") && FolderOf(name) != own) found.Add(name, "", "a dump of a crash");
   }
 }

@@ -1,7 +1,9 @@
 // What support_report does, apart from the process around it: arguments in, texts and an exit code out.
 #pragma once
 
+#include <functional>
 #include <string>
+#include <string_view>
 #include <vector>
 
 #include "report/package_input.h"
@@ -14,7 +16,11 @@ struct ProgramOutput {
   ExitCode code = ExitCode::kNothingFound;
 };
 
+// Is told what is done next, in a few words.
+using Progress = std::function<void(std::string_view step)>;
+
 // Never throws; running out of memory is bad input too.
-ProgramOutput RunProgram(const std::vector<std::wstring>& arguments);
+ProgramOutput RunProgram(
+    const std::vector<std::wstring>& arguments, const Progress& progress = [](std::string_view) {});
 
 }  // namespace report

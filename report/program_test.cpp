@@ -2,6 +2,7 @@
 
 #include <gmock/gmock.h>
 
+#include "core/files.h"
 #include "core/json.h"
 #include "report/arguments.h"
 #include "stutil/development_keys.h"
@@ -92,6 +93,48 @@ TEST(Program, FindingsAreTextOrJson) {
   EXPECT_EQ(finding["evidence"][0]["text"], "x: \x1B[2J");
 }
 
+TEST(Program, AReportReplacesTheTextAndStandsUnderItsNameOnlyWhenItIsWhole) {
+  const TestFolder folder;
+  const std::wstring zip = folder.MakeFile(L"a.zip", CraftZip(kFailed));
+  const std::wstring report = folder.Path(L"r.html");
+  std::vector<std::string> steps;
+  const ProgramOutput output =
+      RunProgram({zip, L"-o", report}, [&](std::string_view step) { steps.emplace_back(step); });
+  EXPECT_EQ(output.code, ExitCode::kFindings) << output.messages;
+  EXPECT_THAT(output.text, HasSubstr("r.html is written. Findings: 1.\n"));
+  EXPECT_THAT(steps, testing::ElementsAre("Opening", "Judging", "Writing the report"));
+  std::string html;
+  ASSERT_EQ(ReadWholeFile(report, 1 << 20, html), DWORD{ERROR_SUCCESS});
+  EXPECT_THAT(html, HasSubstr("\"collector-failed\""));
+  EXPECT_THAT(RunProgram({zip, L"-o", report, L"--json"}).text, testing::StartsWith("{"));
+  EXPECT_FALSE(PathExists(report + L".partial"));
+}
+
+TEST(Program, AReportDoesNotReplaceWhatIsRead) {
+  const TestFolder folder;
+  const std::wstring zip = folder.MakeFile(L"a.zip", CraftZip(kFailed));
+  const std::wstring other = folder.MakeFile(L"b.zip", CraftZip(kFailed));
+  const struct {
+    std::vector<std::wstring> arguments;
+    const char* message;
+  } rows[] = {
+      {{zip, L"-o", folder.Path(L"x\\..\\A.ZIP")}, "which is read"},
+      {{zip, L"--compare", other, L"-o", other}, "which is read"},
+      {{zip, L"-o", folder.Path()}, "is a folder"},
+      {{zip, L"-o", folder.Path(L"absent\\r.html")}, "cannot be written, error 3"},
+      {{zip, L"--compare", folder.Path(L"absent")}, "absent cannot be read, error 2"},
+  };
+  for (const auto& row : rows) {
+    const ProgramOutput output = RunProgram(row.arguments);
+    EXPECT_EQ(output.code, ExitCode::kBadInput) << row.message;
+    EXPECT_THAT(output.messages, HasSubstr(row.message));
+    EXPECT_EQ(output.text, "");
+  }
+  std::string bytes;
+  ReadWholeFile(zip, 1 << 20, bytes);
+  EXPECT_EQ(bytes, CraftZip(kFailed));
+}
+
 TEST(Program, UnpacksAndTellsWhatItLeftOut) {
   const TestFolder folder;
   std::vector<CraftedEntry> entries = kFailed;
@@ -107,8 +150,11 @@ TEST(Program, UnpacksAndTellsWhatItLeftOut) {
 
 TEST(ReportArguments, AreUnderstoodInAnyOrder) {
   Arguments arguments;
-  EXPECT_EQ(ParseArguments({L"--json", L"--key", L"--k", L"--extract", L"x", L"--", L"--p"}, arguments), "");
-  EXPECT_EQ(arguments, (Arguments{L"--p", L"--k", L"x", true}));
+  EXPECT_EQ(
+      ParseArguments({L"--json", L"--key", L"--k", L"--extract", L"x", L"-o", L"r", L"--compare", L"c", L"--", L"--p"},
+                     arguments),
+      "");
+  EXPECT_EQ(arguments, (Arguments{L"--p", L"--k", L"x", L"c", L"r", true}));
   arguments = {};
   EXPECT_EQ(ParseArguments({L"--help"}, arguments), "");
   EXPECT_THAT(ParseArguments({L"a", L"b"}, arguments), HasSubstr("Only one package"));

@@ -52,4 +52,33 @@ std::optional<double> TimeFromEvent(std::string_view text) {
   return n ? Seconds((*n)[2], (*n)[0], (*n)[1], (*n)[3], (*n)[4], (*n)[5]) : std::nullopt;
 }
 
+std::optional<double> TimeFromDay(std::string_view text) {
+  if (text.size() != 8) return std::nullopt;
+  std::string_view year = text.substr(0, 4);
+  std::string_view month = text.substr(4, 2);
+  std::string_view day = text.substr(6);
+  const auto y = TakeNumber(year, '\0');
+  const auto m = TakeNumber(month, '\0');
+  const auto d = TakeNumber(day, '\0');
+  return y && m && d ? Seconds(*y, *m, *d, 0, 0, 0) : std::nullopt;
+}
+
+double SecondsFromFileTime(double units) {
+  return units / 1e7 - 11'644'473'600.0;
+}
+
+std::optional<double> OffsetOfTimeZone(std::string_view caption) {
+  if (!caption.starts_with("(UTC") && !caption.starts_with("(GMT")) return std::nullopt;
+  caption.remove_prefix(4);
+  if (caption.starts_with(')')) return 0;
+  const double sign = caption.starts_with('-') ? -1 : 1;
+  if (!caption.starts_with('-') && !caption.starts_with('+')) return std::nullopt;
+  caption.remove_prefix(1);
+  const auto hours = TakeNumber(caption, ':');
+  std::string_view rest = caption.substr(0, 2);
+  const auto minutes = TakeNumber(rest, '\0');
+  if (!hours || !minutes || *hours > 14 || *minutes > 59) return std::nullopt;
+  return sign * (*hours * kHour + *minutes * 60.0);
+}
+
 }  // namespace report

@@ -18,4 +18,13 @@ std::optional<double> TimeFromIso(std::string_view text);
 // "3/4/2024 09:05:07", the month first: the event log's local time, taken as if it were UTC.
 std::optional<double> TimeFromEvent(std::string_view text);
 
+// "20240304", a day's beginning; nothing for any other text.
+std::optional<double> TimeFromDay(std::string_view text);
+
+// Of units of 100 ns since 1601.
+double SecondsFromFileTime(double units);
+
+// How far local time is ahead of UTC by the name of a time zone, "(UTC+02:00) Bucharest" say; summer time is not in it.
+std::optional<double> OffsetOfTimeZone(std::string_view caption);
+
 }  // namespace report

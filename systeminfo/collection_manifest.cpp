@@ -63,6 +63,7 @@ Json::Value BuildManifest(const ManifestHeader& header, const std::vector<Collec
   manifest["tool_version"] = header.toolVersion;
   manifest["start"] = header.startUtc;
   manifest["end"] = header.endUtc;
+  manifest["utc_offset_minutes"] = header.utcOffsetMinutes;
   manifest["collectors"] = Json::Value(Json::arrayValue);
   for (const CollectorOutcome& collector : collectors)
     manifest["collectors"].append(CollectorEntry(collector));
@@ -86,6 +87,19 @@ std::string CurrentTimeUtc() {
   std::snprintf(text, sizeof text, "%04u-%02u-%02uT%02u:%02u:%02uZ", unsigned{now.wYear}, unsigned{now.wMonth},
                 unsigned{now.wDay}, unsigned{now.wHour}, unsigned{now.wMinute}, unsigned{now.wSecond});
   return text;
+}
+
+int CurrentUtcOffset() {
+  TIME_ZONE_INFORMATION zone{};
+  const DWORD part = GetTimeZoneInformation(&zone);
+  if (part == TIME_ZONE_ID_INVALID) {
+    LOG_ERROR(L"systeminfo::CurrentUtcOffset", L"GetTimeZoneInformation() %u", GetLastError());
+    return 0;
+  }
+  const LONG ofSeason = part == TIME_ZONE_ID_DAYLIGHT   ? zone.DaylightBias
+                        : part == TIME_ZONE_ID_STANDARD ? zone.StandardBias
+                                                        : 0;
+  return static_cast<int>(-(zone.Bias + ofSeason));
 }
 
 }  // namespace systeminfo

@@ -38,6 +38,7 @@ struct ManifestHeader {
   std::string toolVersion;
   std::string startUtc;  // ISO 8601, as CurrentTimeUtc gives it
   std::string endUtc;
+  int utcOffsetMinutes = 0;  // how far local time is ahead of UTC, as in the event logs of the collection
 };
 
 Json::Value BuildManifest(const ManifestHeader& header, const std::vector<CollectorOutcome>& collectors);
@@ -48,5 +49,6 @@ bool WriteManifest(std::wstring_view folder, const ManifestHeader& header,
                    const std::vector<CollectorOutcome>& collectors);
 
 std::string CurrentTimeUtc();  // "2024-05-31T09:08:07Z"
+int CurrentUtcOffset();        // minutes
 
 }  // namespace systeminfo

@@ -16,7 +16,7 @@ Json::Value Parsed(std::string_view text) {
   return value;
 }
 
-const ManifestHeader kHeader{"1.2.3", "2024-05-31T09:08:07Z", "2024-05-31T09:09:00Z"};
+const ManifestHeader kHeader{"1.2.3", "2024-05-31T09:08:07Z", "2024-05-31T09:09:00Z", -210};
 
 TEST(CountRecords, ArraysCountTheirElementsAndOtherValuesAreOneRecord) {
   struct {
@@ -45,7 +45,7 @@ TEST(CollectionManifest, EachOutcomeIsToldApart) {
       {L"printers", L"PrintersCollector", Outcome::kNotWritten, L"error 112", 5, 0, 3, {}},
   };
   EXPECT_EQ(WriteStyledJson(BuildManifest(kHeader, outcomes)), WriteStyledJson(Parsed(R"({
-    "tool_version": "1.2.3", "start": "2024-05-31T09:08:07Z", "end": "2024-05-31T09:09:00Z",
+    "tool_version": "1.2.3", "start": "2024-05-31T09:08:07Z", "end": "2024-05-31T09:09:00Z", "utc_offset_minutes": -210,
     "collectors": [
       {"name": "storage", "class": "DiskCollector", "outcome": "data",
        "records": 3, "bytes": 99, "milliseconds": 12, "errors": []},
@@ -72,6 +72,16 @@ TEST(CollectionManifest, FileIsIndentedAndAFailureIsLogged) {
 
 TEST(CollectionManifest, TimeHasTheIsoForm) {
   EXPECT_THAT(CurrentTimeUtc(), testing::MatchesRegex("\\d\\d\\d\\d-\\d\\d-\\d\\dT\\d\\d:\\d\\d:\\d\\dZ"));
+}
+
+TEST(CollectionManifest, TheOffsetIsThatOfTheLocalTime) {
+  SYSTEMTIME utc{};
+  SYSTEMTIME local{};
+  GetSystemTime(&utc);
+  GetLocalTime(&local);
+  const int minutes = (local.wHour - utc.wHour) * 60 + local.wMinute - utc.wMinute;
+  // The clock moves between the calls, and the date may differ.
+  EXPECT_LE(std::abs((CurrentUtcOffset() - minutes + 1440 + 720) % 1440 - 720), 1);
 }
 
 }  // namespace

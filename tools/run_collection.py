@@ -196,6 +196,18 @@ def summary(manifest, package, plain, log, seconds):
     print(f"   time      {seconds:.1f} s\n")
 
 
+def write_report(folder, package, report):
+    """The package as an HTML report; what the program says of it."""
+    result = subprocess.run(["wine", "support_report.exe", unix_to_windows(package), "--key", unix_to_windows(DEVELOPMENT_KEY),
+                             "-o", unix_to_windows(report)], cwd=folder, check=False, timeout=TIME_LIMIT,
+                            stdin=subprocess.DEVNULL, capture_output=True)
+    # The exit status 1 says that there are findings.
+    if result.returncode not in (0, 1) or not report.exists():
+        raise RunFailed(f"no report was written: {result.stderr.decode('utf-8', 'replace').strip()}")
+    said = result.stdout.decode("utf-8", "replace")
+    return said[said.rfind("Findings"):].strip()
+
+
 def main(release, run_folder, *options):
     run_folder = Path(run_folder).resolve()
     shutil.rmtree(run_folder, ignore_errors=True)
@@ -221,6 +233,8 @@ def main(release, run_folder, *options):
     if log.return_code() != 1 or not plain.exists():
         raise RunFailed(f"the package could not be decrypted; see {log.path}")
     summary(check_archive(plain), package, plain, log, seconds)
+    report = run_folder / "report.html"
+    print(f"   report    {report}  ({write_report(run_folder, package, report)})")
     print(f"== the package is whole: collected, packed, encrypted, {receiver.result}, and opened again")
 
 

@@ -24,6 +24,7 @@ import time
 from typing import NamedTuple
 
 import make_corpus
+import make_package
 
 ROOT = os.path.dirname(os.path.dirname(os.path.dirname(os.path.abspath(__file__))))
 sys.path.insert(0, f"{ROOT}/tests/support")
@@ -325,6 +326,25 @@ def report_page(bench):
     yield Line("  keystroke", f"{figures['keystroke_ms']:.0f} ms", "-", None, 100, figures["keystroke_ms"])
     yield Line("  slowest keystroke", f"{figures['slowest_keystroke_ms']:.0f} ms", "-", None, 100, figures["slowest_keystroke_ms"])
     remove(report)
+def report(bench):
+    package, page = make_package.make_package(f"{FOLDER}/package.zip"), f"{FOLDER}/report.html"
+    ours = bench.ours("support_report", package.rsplit("/", 1)[1], "-o", "report.html")
+    # The peer unpacks and parses the same documents, and writes them again as one; findings are exit code 1.
+    peer = ("import json, sys, zipfile; archive = zipfile.ZipFile(sys.argv[1]); "
+            "documents = {n: json.loads(archive.read(n)) for n in archive.namelist() if n.endswith('.json')}; "
+            "json.dump(documents, open(sys.argv[2], 'w'))")
+    line = bench.compare("report", 1.5, ["sh", "-c", '"$@" > report.log; [ $? -le 1 ]', "sh", *ours],
+                         [sys.executable, "-c", peer, package, f"{FOLDER}/peer.json"], lambda: remove(page))
+    yield line
+    yield Line("  seconds", line.ours, "-", None, 3, float(line.ours.split()[0]))
+    bench.run(["sh", "-c", '"$@" > report.log; [ $? -le 1 ]', "sh", *ours], wine=True)
+    with open(page, encoding="utf-8") as file:
+        data = json.loads(re.search(r'<script type="application/json" id="report-data">(.*?)</script>', file.read(), re.S)[1])
+    rows = {table["id"]: len(table["rows"]) for table in data["tables"]}
+    if (rows["events"], rows["processes"]) != (50_000, 400):
+        raise RuntimeError(f"the report holds {rows}")
+    for path in (page, f"{FOLDER}/peer.json", f"{FOLDER}/report.log"):
+        remove(path)
 
 
 ROWS = {
@@ -341,6 +361,7 @@ ROWS = {
     "event-queue": ("1,000 items of 10 ms: median error of the period, and processors taken; against a thread for each", event_queue),
     "upload": ("50 MiB to a tus server on loopback, against one PATCH by curl; its peak memory over idle", upload),
     "report-page": ("a report of 50,000 events in Chromium: until its table is drawn, and from a keystroke to the rows it leaves", report_page),
+    "report": ("a package of 50,000 events and 400 processes to an HTML report, against Python parsing and writing it", report),
     "start": ("start, first log lines, end; against an empty GUI program", start),
 }
 
