@@ -12,6 +12,7 @@
 #include "core/json.h"
 #include "core/logging.h"
 #include "core/paths.h"
+#include "core/private_access.h"
 #include "core/text.h"
 #include "systeminfo/collector_table.h"
 #include "systeminfo/settings_check.h"
@@ -153,9 +154,10 @@ bool DataCollectorImpl::CreateOutputFolder() const {
     LOG_ERROR(kCreateOutputFolder, L"%s already exists. doing nothing", kOutputFolderKey);
     return false;
   }
-  // Somebody who made the folder since the test above is as good as ourselves.
-  const DWORD error = CreatePrivateFolder(folder);
-  if (error == ERROR_SUCCESS || error == ERROR_ALREADY_EXISTS) return true;
+  DWORD error = CreatePrivateFolder(folder);
+  // Somebody may have made the folder since the test above: as good as ourselves, if nobody else can reach into it.
+  if (error == ERROR_ALREADY_EXISTS) error = MakeFolderPrivate(folder);
+  if (error == ERROR_SUCCESS) return true;
   LOG_ERROR(kCreateOutputFolder, L"failed to create output folder %s", folder.c_str());
   LOG_ERROR(kCreateOutputFolder, L"error %u", error);
   return false;

@@ -9,6 +9,7 @@
 #include "companions/engine/browser_command.h"
 #include "core/delete_folder.h"
 #include "core/files.h"
+#include "core/private_access.h"
 #include "core/format.h"
 #include "core/text.h"
 
