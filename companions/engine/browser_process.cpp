@@ -9,8 +9,8 @@
 #include "companions/engine/browser_command.h"
 #include "core/delete_folder.h"
 #include "core/files.h"
-#include "core/private_access.h"
 #include "core/format.h"
+#include "core/private_access.h"
 #include "core/text.h"
 
 namespace engine {
