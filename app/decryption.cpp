@@ -36,7 +36,7 @@ bool OpenPackage(const DecryptParameters& parameters) {
     LOG_ERROR(kScope, L"Decryption failed with code %d", error);
     return false;
   }
-  const DWORD error = WriteWholeFile(parameters.outputFile, std::string_view(archive));
+  const DWORD error = WriteWholeFile(parameters.outputFile, std::string_view(archive), FileRights::kPrivate);
   if (error != ERROR_SUCCESS) LOG_ERROR(kScope, L"cannot write %s, error %u", parameters.outputFile.c_str(), error);
   return error == ERROR_SUCCESS;
 }

@@ -12,6 +12,7 @@
 #include "app/instance.h"
 #include "app/modes.h"
 #include "app/options.h"
+#include "core/abandoned_threads.h"
 #include "core/dynamic_library.h"
 #include "core/logger_config.h"
 #include "core/logging.h"
@@ -80,5 +81,5 @@ int WINAPI wWinMain(HINSTANCE, HINSTANCE, PWSTR commandLine, int) {
     }
   } catch (...) {  // no memory even for the log; there is nobody left to tell
   }
-  return 0;
+  return EndingCode(0);
 }

@@ -4,6 +4,7 @@
 
 #include "core/delete_folder.h"
 #include "core/files.h"
+#include "core/folder_entries.h"
 #include "core/json.h"
 #include "core/logging.h"
 #include "core/paths.h"
@@ -30,12 +31,12 @@ std::wstring FolderOfElement(const Json::Value& element) {
 std::vector<std::wstring> FindInstallLogs(const std::wstring& temporaryFolder, const std::wstring& outputFolder) {
   const std::wstring ownFolder = ExtendedPath(outputFolder);
   std::vector<std::wstring> files;
-  WalkDir(temporaryFolder, [&](const qx::PathString& path, uint32_t) {
+  WalkDir(temporaryFolder, [&](const qx::PathString& path, const WIN32_FIND_DATAW& entry) {
     const std::wstring_view text(path);
     if (CompareStringOrdinal(ExtendedPath(text).c_str(), -1, ownFolder.c_str(), -1, TRUE) == CSTR_EQUAL) {
       return kWalkSkip;
     }
-    if (text.find(L"qxinst.") != std::wstring_view::npos) files.emplace_back(text);
+    if (!IsLink(entry) && text.find(L"qxinst.") != std::wstring_view::npos) files.emplace_back(text);
     return kWalkContinue;
   });
   return files;

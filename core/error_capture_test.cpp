@@ -31,5 +31,22 @@ TEST(ErrorCapture, DroppedLinesAreCounted) {
   EXPECT_EQ(lines.back(), L"(3 more lines)");
 }
 
+TEST(ErrorCapture, LinesOfAThreadBehindAClosedGateAreNobodys) {
+  ErrorCapture errors;
+  std::atomic<bool> isClosed{false};
+  const auto logTwice = [&] {
+    {
+      const CaptureGate gate(isClosed);
+      LOG_ERROR(L"f", L"behind a gate");
+    }
+    LOG_ERROR(L"f", L"without one");
+  };
+  logTwice();
+  EXPECT_THAT(errors.Take(), ElementsAre(L"f: behind a gate", L"f: without one"));
+  isClosed = true;
+  logTwice();
+  EXPECT_THAT(errors.Take(), ElementsAre(L"f: without one"));
+}
+
 }  // namespace
 }  // namespace logging

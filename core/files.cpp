@@ -1,10 +1,10 @@
 #include "core/files.h"
 
-#include <aclapi.h>
-#include <sddl.h>
-
 #include <algorithm>
 #include <vector>
+
+#include "core/own_files.h"
+#include "core/private_access.h"
 
 namespace {
 
@@ -40,19 +40,6 @@ std::wstring CurrentDirectory() {
   std::wstring folder(GetCurrentDirectoryW(0, nullptr), L'\0');
   folder.resize(GetCurrentDirectoryW(static_cast<DWORD>(folder.size()), folder.data()));
   return folder;
-}
-
-// Grants the current user, the administrators and the system everything, and nobody else anything.
-std::wstring PrivateFolderDescriptor() {
-  KernelHandle token;
-  if (!OpenProcessToken(GetCurrentProcess(), TOKEN_QUERY, token.Receive())) return {};
-  DWORD size = 0;
-  GetTokenInformation(token.Get(), TokenUser, nullptr, 0, &size);
-  std::vector<std::byte> user(size);
-  if (!GetTokenInformation(token.Get(), TokenUser, user.data(), size, &size)) return {};
-  LocalMemory<wchar_t> sid;
-  if (!ConvertSidToStringSidW(reinterpret_cast<const TOKEN_USER*>(user.data())->User.Sid, sid.Receive())) return {};
-  return L"D:P(A;OICI;FA;;;SY)(A;OICI;FA;;;BA)(A;OICI;FA;;;" + std::wstring(sid.Get()) + L")";
 }
 
 DWORD WriteAll(HANDLE file, std::string_view bytes) {
@@ -167,8 +154,8 @@ DWORD ReadWholeFile(std::wstring_view path, uint64_t limit, std::string& bytes) 
   return ReadBytes(file.Get(), static_cast<size_t>(size.QuadPart), bytes);
 }
 
-DWORD WriteWholeFile(std::wstring_view path, std::string_view bytes) {
-  PartialFile file(path);
+DWORD WriteWholeFile(std::wstring_view path, std::string_view bytes, FileRights rights) {
+  PartialFile file(path, rights);
   DWORD error = file.Create();
   if (error == ERROR_SUCCESS) error = file.Write(bytes);
   if (error == ERROR_SUCCESS) error = file.Publish();
@@ -181,8 +168,9 @@ PartialFile::~PartialFile() {
 }
 
 DWORD PartialFile::Create() {
-  m_file.Reset(CreateFileW((m_path + kPartialSuffix).c_str(), GENERIC_READ | GENERIC_WRITE, 0, nullptr, CREATE_ALWAYS,
-                           FILE_ATTRIBUTE_NORMAL, nullptr));
+  const PrivateAccess rights = m_rights == FileRights::kPrivate ? PrivateAccess::OfFile() : PrivateAccess();
+  if (rights.Error() != ERROR_SUCCESS) return rights.Error();
+  m_file = CreateFreshFile((m_path + kPartialSuffix).c_str(), GENERIC_READ | GENERIC_WRITE, 0, rights.Attributes());
   if (!m_file) return GetLastError();
   m_isCreated = true;
   return ERROR_SUCCESS;
@@ -210,16 +198,6 @@ DWORD PublishPartialFile(std::wstring_view path) {
   return MoveFileExW(partial.c_str(), target.c_str(), MOVEFILE_REPLACE_EXISTING | MOVEFILE_WRITE_THROUGH)
              ? ERROR_SUCCESS
              : GetLastError();
-}
-
-DWORD CreatePrivateFolder(std::wstring_view path) {
-  LocalMemory<void> descriptor;
-  if (!ConvertStringSecurityDescriptorToSecurityDescriptorW(PrivateFolderDescriptor().c_str(), SDDL_REVISION_1,
-                                                            descriptor.Receive(), nullptr)) {
-    return GetLastError();
-  }
-  SECURITY_ATTRIBUTES attributes{sizeof attributes, descriptor.Get(), FALSE};
-  return CreateDirectoryW(ExtendedPath(path).c_str(), &attributes) ? ERROR_SUCCESS : GetLastError();
 }
 
 DWORD CreateFolders(std::wstring_view path) {

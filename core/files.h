@@ -39,9 +39,15 @@ DWORD ReadBytes(HANDLE file, size_t count, std::string& bytes);
 // Reads a whole file into `bytes`. ERROR_FILE_TOO_LARGE when it is longer than `limit`; nothing is read then.
 DWORD ReadWholeFile(std::wstring_view path, uint64_t limit, std::string& bytes);
 
+// Who may do what with a new file.
+enum class FileRights {
+  kInherited,  // what the folder gives
+  kPrivate,    // only the current user, the administrators and the system
+};
+
 // Writes a whole file, replacing an older one. The bytes go to "<path>.partial", are flushed to the disk and renamed,
-// so that whatever happens no half-written file ever stands under `path`.
-DWORD WriteWholeFile(std::wstring_view path, std::string_view bytes);
+// so that whatever happens no half-written file ever stands under `path`. A link under either name is replaced itself.
+DWORD WriteWholeFile(std::wstring_view path, std::string_view bytes, FileRights rights = FileRights::kInherited);
 
 inline constexpr wchar_t kPartialSuffix[] = L".partial";
 
@@ -49,7 +55,8 @@ inline constexpr wchar_t kPartialSuffix[] = L".partial";
 // not published is deleted with its owner.
 class PartialFile {
  public:
-  explicit PartialFile(std::wstring_view path) : m_path(ExtendedPath(path)) {}
+  explicit PartialFile(std::wstring_view path, FileRights rights = FileRights::kInherited)
+      : m_path(ExtendedPath(path)), m_rights(rights) {}
   ~PartialFile();
   PartialFile(const PartialFile&) = delete;
   PartialFile& operator=(const PartialFile&) = delete;
@@ -62,15 +69,13 @@ class PartialFile {
 
  private:
   const std::wstring m_path;  // extended
+  const FileRights m_rights;
   KernelHandle m_file;
   bool m_isCreated = false;
 };
 
 // Makes a finished "<path>.partial" the file `path`, replacing an older one. On failure the partial file stays.
 DWORD PublishPartialFile(std::wstring_view path);
-
-// One level, no parents. Only the current user, the administrators and the system may enter it.
-DWORD CreatePrivateFolder(std::wstring_view path);
 
 // Makes a folder and those of its parents that are missing, with the rights they inherit. One that is there is fine.
 DWORD CreateFolders(std::wstring_view path);

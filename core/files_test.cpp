@@ -126,13 +126,3 @@ TEST(Files, ExistenceTellsFilesFromFolders) {
   EXPECT_FALSE(FolderExists(file) || PathExists(folder.Path(L"missing")) || FolderExists(folder.Path(L"missing")));
   EXPECT_FALSE(PathExists(L"") || FolderExists(L""));
 }
-
-TEST(CreatePrivateFolder, MakesOneLevelThatItsCreatorCanUse) {
-  const TestFolder folder;
-  const std::wstring path = folder.Path(L"private");
-  EXPECT_EQ(CreatePrivateFolder(path), ERROR_SUCCESS);
-  folder.MakeFile(L"private\\file", "mine");
-  EXPECT_EQ(Content(folder.Path(L"private\\file")), "mine");
-  EXPECT_EQ(CreatePrivateFolder(path), static_cast<DWORD>(ERROR_ALREADY_EXISTS));
-  EXPECT_EQ(CreatePrivateFolder(folder.Path(L"no\\parent")), static_cast<DWORD>(ERROR_PATH_NOT_FOUND));
-}

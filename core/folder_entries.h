@@ -30,6 +30,11 @@ inline bool IsFolder(const WIN32_FIND_DATAW& entry) {
   return (entry.dwFileAttributes & FILE_ATTRIBUTE_DIRECTORY) != 0;
 }
 
+// An entry that stands for a file or folder elsewhere: reading it would read what its maker chose.
+inline bool IsLink(const WIN32_FIND_DATAW& entry) {
+  return (entry.dwFileAttributes & FILE_ATTRIBUTE_REPARSE_POINT) != 0 && IsReparseTagNameSurrogate(entry.dwReserved0);
+}
+
 // A folder whose content belongs to the tree. Not so one that stands for a folder elsewhere (a junction, a symbolic
 // link, a mounted volume) or does not tell what it is: entering it could leave the tree or never end. Folders of a
 // cloud drive are reparse points too, but hold their own content.

@@ -22,6 +22,18 @@ std::weak_ptr<CLogDLL> g_shared;  // guarded by g_bindMutex
 // False while nobody could possibly want a line: the test that every log statement makes first.
 std::atomic<bool> g_anyListener{false};
 
+// What the thread's CaptureGate looks at. A slot of the system's and not a thread_local variable: it costs the threads
+// that have none nothing, and needs no destructor in a library that may be gone by then.
+DWORD GateSlot() {
+  static const DWORD s_slot = TlsAlloc();
+  return s_slot;
+}
+
+bool IsCaptureClosed() {
+  const auto* const isClosed = static_cast<const std::atomic<bool>*>(TlsGetValue(GateSlot()));
+  return isClosed != nullptr && *isClosed;
+}
+
 // Runs `change` while no line is being written.
 template <class Change>
 void ChangeListeners(Change change) {
@@ -95,6 +107,7 @@ bool IsEnabled() {
 
 Route::Route(Level level) : m_level(level) {
   AcquireSRWLockShared(&g_lock);
+  if (g_capture == nullptr || IsCaptureClosed()) return;
   for (const ErrorCapture* capture = g_capture; capture != nullptr; capture = capture->m_outer) {
     m_captures = m_captures || capture->Wants(level);
   }
@@ -121,6 +134,14 @@ void Route::Capture(const wchar_t* function, const wchar_t* format, ...) const n
     // A log line must never be what ends the program.
   }
   va_end(arguments);
+}
+
+CaptureGate::CaptureGate(const std::atomic<bool>& isClosed) {
+  TlsSetValue(GateSlot(), const_cast<std::atomic<bool>*>(&isClosed));
+}
+
+CaptureGate::~CaptureGate() {
+  TlsSetValue(GateSlot(), nullptr);
 }
 
 ErrorCapture::ErrorCapture(Level least, Keep keep) : m_least(least), m_keep(keep) {

@@ -8,6 +8,7 @@
 // narrow). Arguments of a line are not evaluated while logging is off.
 #pragma once
 
+#include <atomic>
 #include <cstdint>
 #include <memory>
 #include <mutex>
@@ -105,6 +106,17 @@ class ErrorCapture {
   std::mutex m_mutex;
   std::vector<std::wstring> m_lines;
   size_t m_dropped = 0;
+};
+
+// While one lives, no capture keeps what its thread logs once `isClosed` is set: the lines of a thread that was left
+// behind do not belong to those who are captured now. They are written to the log all the same. One for each thread;
+// made and destroyed on it.
+class CaptureGate {
+ public:
+  explicit CaptureGate(const std::atomic<bool>& isClosed);
+  ~CaptureGate();
+  CaptureGate(const CaptureGate&) = delete;
+  CaptureGate& operator=(const CaptureGate&) = delete;
 };
 
 // Where one line goes. While it lives neither the library nor the capture can go away.

@@ -129,28 +129,31 @@ TEST(WalkDir, LinksAreVisitedButNotEntered) {
   EXPECT_EQ(Walked(folder.Path(L"a\\loop")), (Names{L"a", L"a\\file", L"a\\loop"})) << "a link as the root is walked";
 }
 
-TEST(IsFolderOfTree, LinksAndFoldersWithoutATagAreNot) {
+TEST(FolderEntries, LinksAndFoldersWithoutATagAreNotOfTheTree) {
   constexpr DWORD kFolder = FILE_ATTRIBUTE_DIRECTORY;
   constexpr DWORD kReparse = FILE_ATTRIBUTE_DIRECTORY | FILE_ATTRIBUTE_REPARSE_POINT;
   constexpr DWORD kCloudTag = 0x9000001A;
   struct {
     DWORD attributes;
     DWORD tag;
-    bool isOfTree;
+    bool isFolderOfTree;
+    bool isLink;
   } const rows[] = {
-      {kFolder, 0, true},
-      {kFolder, IO_REPARSE_TAG_SYMLINK, true},  // not a reparse point: the field means nothing
-      {kReparse, IO_REPARSE_TAG_SYMLINK, false},
-      {kReparse, IO_REPARSE_TAG_MOUNT_POINT, false},
-      {kReparse, 0, false},
-      {kReparse, kCloudTag, true},
-      {FILE_ATTRIBUTE_ARCHIVE, 0, false},
-      {FILE_ATTRIBUTE_REPARSE_POINT, kCloudTag, false},
+      {kFolder, 0, true, false},
+      {kFolder, IO_REPARSE_TAG_SYMLINK, true, false},  // not a reparse point: the field means nothing
+      {kReparse, IO_REPARSE_TAG_SYMLINK, false, true},
+      {kReparse, IO_REPARSE_TAG_MOUNT_POINT, false, true},
+      {kReparse, 0, false, false},
+      {kReparse, kCloudTag, true, false},
+      {FILE_ATTRIBUTE_ARCHIVE, 0, false, false},
+      {FILE_ATTRIBUTE_REPARSE_POINT, kCloudTag, false, false},
+      {FILE_ATTRIBUTE_REPARSE_POINT, IO_REPARSE_TAG_SYMLINK, false, true},
   };
   for (const auto& row : rows) {
     WIN32_FIND_DATAW entry{};
     entry.dwFileAttributes = row.attributes;
     entry.dwReserved0 = row.tag;
-    EXPECT_EQ(IsFolderOfTree(entry), row.isOfTree) << row.attributes << ' ' << row.tag;
+    EXPECT_EQ(IsFolderOfTree(entry), row.isFolderOfTree) << row.attributes << ' ' << row.tag;
+    EXPECT_EQ(IsLink(entry), row.isLink) << row.attributes << ' ' << row.tag;
   }
 }

@@ -107,7 +107,7 @@ void ActionDumpProcess::DumpProcess(HANDLE process, DWORD processId, const std::
 
 // True when the dump stands under its name.
 bool ActionDumpProcess::WriteDump(HANDLE process, DWORD processId, const std::wstring& path, uint64_t& countedBytes) {
-  PartialFile file(path);
+  PartialFile file(path, FileRights::kPrivate);  // it holds another program's memory
   if (const DWORD error = file.Create(); error != ERROR_SUCCESS) {
     LOG_ERROR(kDump, L"Could not create file %s for dump", path.c_str());
     LOG_ERROR(kDump, L"CreateFile failed with error code : %d", error);

@@ -5,6 +5,7 @@
 
 #include "core/files.h"
 #include "core/logging.h"
+#include "core/own_files.h"
 
 namespace st::monitoring {
 namespace {
@@ -29,8 +30,7 @@ void SampleFile::Append(const SYSTEMTIME& utc, double value) {
 
 bool SampleFile::Open() {
   // Nobody else writes: two counters whose ids differ in nothing but their case would mix their samples otherwise.
-  m_file.Reset(CreateFileW(ExtendedPath(m_path).c_str(), FILE_APPEND_DATA | FILE_READ_ATTRIBUTES,
-                           FILE_SHARE_READ | FILE_SHARE_DELETE, nullptr, OPEN_ALWAYS, FILE_ATTRIBUTE_NORMAL, nullptr));
+  m_file = OpenForAppending(ExtendedPath(m_path).c_str(), FILE_SHARE_READ | FILE_SHARE_DELETE);
   LARGE_INTEGER size{};
   if (!m_file || !GetFileSizeEx(m_file.Get(), &size)) {
     LOG_ERROR(kAppend, L"cannot open sample file %s, error %d", m_path.c_str(), GetLastError());

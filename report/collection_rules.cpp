@@ -32,6 +32,7 @@ void FindMissingManifest(const Collection& collection, EvidenceList& found) {
 
 void FindFailedCollectors(const Collection& collection, EvidenceList& found) {
   AddWithOutcome(collection, "failed", found);
+  AddWithOutcome(collection, "timed out", found);
 }
 
 void FindUnwrittenCollectors(const Collection& collection, EvidenceList& found) {

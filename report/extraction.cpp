@@ -5,6 +5,7 @@
 #include "core/files.h"
 #include "core/folder_entries.h"
 #include "core/paths.h"
+#include "core/private_access.h"
 #include "core/text.h"
 #include "report/entry_name.h"
 
@@ -33,7 +34,7 @@ std::string WriteEntry(const Archive& archive, const ArchiveEntry& entry, std::w
 
 std::string PrepareFolder(const std::wstring& folder) {
   const std::wstring path = ExtendedPath(WithoutEndSeparators(folder));
-  if (const DWORD error = CreateFolders(path); error != ERROR_SUCCESS) {
+  if (const DWORD error = CreatePrivateFolders(path); error != ERROR_SUCCESS) {
     return ToUtf8(folder) + " cannot be made, error " + std::to_string(error) + ".";
   }
   bool isEmpty = true;

@@ -3,6 +3,8 @@
 #include <algorithm>
 
 #include "core/files.h"
+#include "core/own_files.h"
+#include "core/private_access.h"
 
 namespace stutil {
 namespace {
@@ -20,8 +22,9 @@ DWORD ArchiveFile::Create(std::wstring_view path) {
     if (error != ERROR_FILE_NOT_FOUND) return error;
   }
   m_partialPath = target + kPartialSuffix;
-  m_file.Reset(CreateFileW(m_partialPath.c_str(), GENERIC_WRITE, FILE_SHARE_READ, nullptr, CREATE_ALWAYS,
-                           FILE_ATTRIBUTE_NORMAL, nullptr));
+  const PrivateAccess rights = PrivateAccess::OfFile();  // the package's content, not encrypted yet
+  if (rights.Error() != ERROR_SUCCESS) return rights.Error();
+  m_file = CreateFreshFile(m_partialPath.c_str(), GENERIC_WRITE, FILE_SHARE_READ, rights.Attributes());
   if (!m_file) return GetLastError();
   m_buffer.reserve(kBufferSize);
   return ERROR_SUCCESS;

@@ -2,15 +2,14 @@
 // taker, so that the memory does not grow with the files.
 #pragma once
 
-#include <condition_variable>
 #include <cstddef>
 #include <exception>
 #include <memory>
-#include <mutex>
 #include <span>
 #include <thread>
 #include <vector>
 
+#include "core/lock.h"
 #include "stutil/pack_worker.h"
 
 namespace stutil {
@@ -47,9 +46,9 @@ class PackPipeline {
   const std::span<const PackJob> m_jobs;
   std::vector<Slot> m_slots;
 
-  std::mutex m_mutex;  // guards the rest, and the slots' isReady
-  std::condition_variable m_slotReady;
-  std::condition_variable m_slotFree;
+  SharedLock m_mutex;  // guards the rest, and the slots' isReady
+  Condition m_slotReady;
+  Condition m_slotFree;
   size_t m_claimed = 0;      // jobs that workers took
   size_t m_returned = 0;     // … whose slots the taker gave back
   bool m_isHolding = false;  // the taker has the result of job m_returned

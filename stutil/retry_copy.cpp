@@ -7,6 +7,7 @@
 #include <thread>
 
 #include "core/files.h"
+#include "core/own_files.h"
 #include "stutil/entry_assembler.h"
 
 namespace stutil {
@@ -21,11 +22,7 @@ constexpr milliseconds kPause{25};
 class ScopedCopy {
  public:
   explicit ScopedCopy(const std::wstring& path) : m_path(path) {}
-  ~ScopedCopy() {
-    if (DeleteFileW(m_path.c_str()) || GetLastError() != ERROR_ACCESS_DENIED) return;
-    SetFileAttributesW(m_path.c_str(), FILE_ATTRIBUTE_NORMAL);  // a copy is read-only when its source is
-    DeleteFileW(m_path.c_str());
-  }
+  ~ScopedCopy() { DeleteFileW(m_path.c_str()); }
   ScopedCopy(const ScopedCopy&) = delete;
   ScopedCopy& operator=(const ScopedCopy&) = delete;
 
@@ -45,8 +42,7 @@ bool CopyRetrier::Add(const FileRecord& file) {
 
 bool CopyRetrier::CopyPatiently(const std::wstring& source, const std::wstring& target) {
   milliseconds left = std::min(m_patience, kPatienceForOneFile);
-  while (!CopyFileW(source.c_str(), target.c_str(), FALSE)) {
-    const DWORD error = GetLastError();
+  while (const DWORD error = CopyToFreshFile(source.c_str(), target.c_str())) {
     const bool isHeld = error == ERROR_SHARING_VIOLATION || error == ERROR_LOCK_VIOLATION;
     if (!isHeld || left <= milliseconds::zero()) return false;
     std::this_thread::sleep_for(kPause);

@@ -6,6 +6,7 @@
 #include <system_error>
 
 #include "core/files.h"
+#include "core/folder_entries.h"
 #include "core/logging.h"
 #include "core/paths.h"
 #include "core/text.h"
@@ -29,7 +30,7 @@ constexpr uint64_t Combine(DWORD high, DWORD low) {
 void CollectRecords(std::wstring_view folder, std::wstring_view archivePath, std::vector<FileRecord>& files) {
   const std::wstring_view rootName = LastPathComponent(folder);
   WalkDir(folder, [&](const qx::PathString& path, WIN32_FIND_DATAW entry) {
-    if ((entry.dwFileAttributes & FILE_ATTRIBUTE_DIRECTORY) != 0) return kWalkContinue;
+    if (IsFolder(entry) || IsLink(entry)) return kWalkContinue;
     const std::wstring_view source(path.c_str(), path.size());
     if (source.ends_with(kPartialSuffix) && ExtendedPath(source) == archivePath) return kWalkContinue;
     files.push_back(

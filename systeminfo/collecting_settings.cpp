@@ -22,6 +22,15 @@ bool CollectingSettings::IsTrue(std::wstring_view key) const {
   return IsSettingTrue(m_document, ToUtf8(key));
 }
 
+std::chrono::milliseconds CollectingSettings::GetCollectorTimeout() const {
+  if (const auto timeout = CollectorTimeout(m_document)) return *timeout;
+  LOG_ERROR(L"systeminfo::CollectingSettings::GetCollectorTimeout",
+            L"collector_timeout is no number of seconds from 0 to %u; %u are taken",
+            static_cast<unsigned>(kLongestCollectorTimeout.count()),
+            static_cast<unsigned>(kDefaultCollectorTimeout.count()));
+  return kDefaultCollectorTimeout;
+}
+
 OutputFolderStatus CollectingSettings::GetOutputFolderValue(std::wstring& out) const {
   const Json::Value* value = FindSetting(m_document, "output_folder");
   if (value == nullptr) return OutputFolderStatus::kAbsent;

@@ -5,6 +5,7 @@
 
 #include <json/value.h>
 
+#include <chrono>
 #include <string>
 #include <string_view>
 
@@ -30,6 +31,10 @@ class CollectingSettings {
   bool IsTrue(std::wstring_view key) const;
 
   bool GetPrettyPrint() const { return IsTrue(L"pretty_print"); }
+
+  // How long one collector may take; 0: as long as it takes. A member that means nothing is logged, and the default
+  // taken.
+  std::chrono::milliseconds GetCollectorTimeout() const;
 
   // The member "output_folder". `out` is set only when the result is kFound.
   OutputFolderStatus GetOutputFolderValue(std::wstring& out) const;

@@ -23,6 +23,8 @@ const char* OutcomeName(Outcome outcome) {
       return "failed";
     case Outcome::kNotWritten:
       return "not written";
+    case Outcome::kTimedOut:
+      return "timed out";
   }
   return "";
 }

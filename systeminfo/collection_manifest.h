@@ -17,13 +17,14 @@ enum class Outcome {
   kNoData,      // the collector found nothing
   kFailed,      // the collector threw; there is no file
   kNotWritten,  // there were data, but no file could be written
+  kTimedOut,    // it took too long; there is a file when it had gathered something and ended when it was asked to
 };
 
 struct CollectorOutcome {
   std::wstring name;       // the settings key and base name of the file
   std::wstring className;  // tells collectors of one name apart
   Outcome outcome = Outcome::kNoData;
-  std::wstring reason;  // why there is no file; empty for kData
+  std::wstring reason;  // why there is no file, or not a whole one; empty for kData
   uint64_t records = 0;
   uint64_t bytes = 0;                // of the file
   uint64_t milliseconds = 0;         // collecting and writing

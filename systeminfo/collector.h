@@ -27,9 +27,11 @@ class ICollector {
   ICollector(const ICollector&) = delete;
   ICollector& operator=(const ICollector&) = delete;
 
-  // Fills the data, on the thread of the run, once. Data left null mean that nothing was collected; failures are logged
-  // and leave them null or partial. `settings` and `wmi` are never null, and `wmi` is not kept beyond the call. Another
-  // thread may set `*cancel` (null: nobody will) to ask for an early end, with the data gathered so far.
+  // Fills the data, on a thread of the run's own, once. Data left null mean that nothing was collected; failures are
+  // logged and leave them null or partial. `settings` and `wmi` are never null, and `wmi` is not kept beyond the call.
+  // Another thread may set `*cancel` (null: nobody will) to ask for an early end, with the data gathered so far; that
+  // is also how a collector hears that its time is over. One that does not come back is left behind: nothing that it
+  // touches, but what it was made with and given here, may depend on anybody who goes on.
   virtual void Start(const std::shared_ptr<CollectingSettings>& settings, const std::shared_ptr<WMIWrapper>& wmi,
                      const std::atomic<bool>* cancel) = 0;
   virtual Json::Value GetData() const { return m_data; }

@@ -12,11 +12,11 @@
 #include "core/json.h"
 #include "core/logging.h"
 #include "core/paths.h"
+#include "core/private_access.h"
 #include "core/text.h"
 #include "systeminfo/collector_table.h"
 #include "systeminfo/settings_check.h"
 #include "systeminfo/settings_document.h"
-#include "systeminfo/wmi_wrapper.h"
 
 namespace systeminfo {
 namespace {
@@ -57,31 +57,85 @@ std::wstring QuotedNames(const CollectorList& collectors) {
   return names;
 }
 
-// Everything about one run that does not change from collector to collector.
-struct RunContext {
-  std::shared_ptr<CollectingSettings> settings;
-  std::shared_ptr<WMIWrapper> wmi;
-  const std::atomic<bool>* cancel;
-  std::wstring outputFolder;
-  bool pretty;
+// The thread of a run; a new one takes the place of one that was left behind.
+class RunThread {
+ public:
+  RunThread(std::shared_ptr<CollectingSettings> settings, WmiMaker connect, const TimeLimits& limits,
+            const std::atomic<bool>* cancel)
+      : m_settings(std::move(settings)), m_connect(std::move(connect)), m_limits(limits), m_cancel(cancel) {}
+
+  // False when there is no WMI.
+  bool Start() {
+    m_thread.reset();
+    m_thread = std::make_unique<CollectorThread>(m_settings, m_connect, m_limits, m_cancel);
+    try {
+      return m_thread->AwaitConnection();
+    } catch (...) {
+      m_thread.reset();
+      throw;
+    }
+  }
+
+  Ended Run(const std::shared_ptr<ICollector>& collector) {
+    if (m_thread == nullptr || m_thread->IsAbandoned()) Replace();
+    return m_thread->Run(collector);
+  }
+
+ private:
+  // Most collectors have something to tell without WMI too.
+  void Replace() {
+    if (Start() || !m_thread->IsAbandoned()) return;
+    LOG_ERROR(kRunCollectors, L"WMI does not answer any more; the run goes on without it");
+    m_connect = [] { return nullptr; };
+    Start();
+  }
+
+  const std::shared_ptr<CollectingSettings> m_settings;
+  WmiMaker m_connect;
+  const TimeLimits m_limits;
+  const std::atomic<bool>* const m_cancel;
+  std::unique_ptr<CollectorThread> m_thread;
 };
 
-void StartAndWrite(ICollector& collector, const RunContext& context, CollectorOutcome& outcome) {
-  // A collector that finds nothing says so, or why, with its last line, of whatever level.
-  logging::ErrorCapture lastLine(logging::Level::kTrace, logging::ErrorCapture::Keep::kLast);
-  collector.Start(context.settings, context.wmi, context.cancel);
-  const Json::Value& data = collector.Data();
-  if (data.isNull()) {
-    const std::vector<std::wstring> said = lastLine.Take();
-    outcome.reason = said.empty() ? L"nothing was found" : said.back();
-    LOG_TRACE(kRunCollectors, L"No data collected for %s", outcome.name.c_str());
-    return;
-  }
+// Everything about one run that does not change from collector to collector.
+struct RunContext {
+  RunThread thread;
+  std::wstring outputFolder;
+  bool pretty;
+  std::chrono::milliseconds budget;
+};
+
+void WriteData(const Json::Value& data, const RunContext& context, CollectorOutcome& outcome) {
   outcome.records = CountRecords(data);
   const std::wstring path = std::wstring(JoinPath(context.outputFolder, outcome.name)) + L".json";
   const DWORD error = DataCollectorImpl::WriteJsonFile(path, data, context.pretty, outcome.bytes);
   outcome.outcome = error == ERROR_SUCCESS ? Outcome::kData : Outcome::kNotWritten;
   if (error != ERROR_SUCCESS) outcome.reason = Format(L"error %u", error);
+}
+
+void SetTimedOut(CollectorOutcome& outcome, const RunContext& context, Ending ending) {
+  const bool isKept = outcome.outcome == Outcome::kData;
+  outcome.outcome = Outcome::kTimedOut;
+  outcome.reason = Format(L"it took longer than %g seconds", static_cast<double>(context.budget.count()) / 1000);
+  if (isKept) outcome.reason += L"; what it had gathered is kept";
+  if (ending == Ending::kAbandoned) outcome.reason += L", does not answer and was left behind";
+  LOG_ERROR(kRunCollectors, L"The collector of %s timed out: %s", outcome.name.c_str(), outcome.reason.c_str());
+}
+
+void StartAndWrite(const std::shared_ptr<ICollector>& collector, RunContext& context, CollectorOutcome& outcome) {
+  // A collector that finds nothing says so, or why, with its last line, of whatever level.
+  logging::ErrorCapture lastLine(logging::Level::kTrace, logging::ErrorCapture::Keep::kLast);
+  const Ended ended = context.thread.Run(collector);
+  if (ended.failure) std::rethrow_exception(ended.failure);
+  const bool hasData = ended.ending != Ending::kAbandoned && !collector->Data().isNull();
+  if (hasData) {
+    WriteData(collector->Data(), context, outcome);
+  } else {
+    const std::vector<std::wstring> said = lastLine.Take();
+    outcome.reason = said.empty() ? L"nothing was found" : said.back();
+    LOG_TRACE(kRunCollectors, L"No data collected for %s", outcome.name.c_str());
+  }
+  if (ended.ending != Ending::kInTime) SetTimedOut(outcome, context, ended.ending);
 }
 
 void SetFailed(CollectorOutcome& outcome, std::wstring reason) {
@@ -93,13 +147,13 @@ void SetFailed(CollectorOutcome& outcome, std::wstring reason) {
 }
 
 // The boundary that no exception of a collector passes.
-CollectorOutcome RunOne(const PlannedCollector& planned, const RunContext& context) {
+CollectorOutcome RunOne(const PlannedCollector& planned, RunContext& context) {
   CollectorOutcome outcome;
   outcome.name = planned.collector->GetName();
   outcome.className = planned.className;
   const auto start = std::chrono::steady_clock::now();
   try {
-    StartAndWrite(*planned.collector, context, outcome);
+    StartAndWrite(planned.collector, context, outcome);
   } catch (const std::exception& exception) {
     SetFailed(outcome, ToWide(exception.what()));
   } catch (...) {
@@ -112,7 +166,9 @@ CollectorOutcome RunOne(const PlannedCollector& planned, const RunContext& conte
 
 }  // namespace
 
-DataCollectorImpl::DataCollectorImpl(std::shared_ptr<CollectingSettings> settings) : m_settings(std::move(settings)) {}
+DataCollectorImpl::DataCollectorImpl(std::shared_ptr<CollectingSettings> settings, WmiMaker connect,
+                                     const TimeLimits& limits)
+    : m_settings(std::move(settings)), m_connect(std::move(connect)), m_limits(limits) {}
 
 int DataCollectorImpl::CollectAll(const std::atomic<bool>* cancel, const ProgressCallback& progress) {
   return RunCollectors(cancel, progress, BuildCollectors());
@@ -153,9 +209,10 @@ bool DataCollectorImpl::CreateOutputFolder() const {
     LOG_ERROR(kCreateOutputFolder, L"%s already exists. doing nothing", kOutputFolderKey);
     return false;
   }
-  // Somebody who made the folder since the test above is as good as ourselves.
-  const DWORD error = CreatePrivateFolder(folder);
-  if (error == ERROR_SUCCESS || error == ERROR_ALREADY_EXISTS) return true;
+  DWORD error = CreatePrivateFolder(folder);
+  // Somebody may have made the folder since the test above: as good as ourselves, if nobody else can reach into it.
+  if (error == ERROR_ALREADY_EXISTS) error = MakeFolderPrivate(folder);
+  if (error == ERROR_SUCCESS) return true;
   LOG_ERROR(kCreateOutputFolder, L"failed to create output folder %s", folder.c_str());
   LOG_ERROR(kCreateOutputFolder, L"error %u", error);
   return false;
@@ -167,9 +224,10 @@ int DataCollectorImpl::RunCollectors(const std::atomic<bool>* cancel, const Prog
   m_settings->Print();
   LOG_TRACE(kRunCollectors, L"Collecting data for : [%s]", QuotedNames(collectors).c_str());
   if (!CreateOutputFolder()) return kRunNoOutputFolder;
-  const RunContext context{m_settings, std::make_shared<WMIWrapper>(), cancel, GetOutputFolder(),
-                           m_settings->GetPrettyPrint()};
-  if (context.wmi->Init() != 0) {
+  m_limits.budget = m_settings->GetCollectorTimeout();
+  RunContext context{RunThread(m_settings, m_connect, m_limits, cancel), GetOutputFolder(),
+                     m_settings->GetPrettyPrint(), m_limits.budget};
+  if (!context.thread.Start()) {
     LOG_ERROR(kRunCollectors, L"wmiwrapper init failed; will not continue");
     return kRunNoWmi;
   }

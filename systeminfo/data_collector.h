@@ -1,6 +1,7 @@
-// Runs the collectors that the settings enable, one after another on the caller's thread, and writes what each gathers
-// as one JSON file, named after it, into a fresh output folder. Nothing that a collector does, an exception included,
-// ends the run or reaches the caller. One object serves one run.
+// Runs the collectors that the settings enable, one after another, and writes what each gathers as one JSON file, named
+// after it, into a fresh output folder. They work on a thread of the run's own while the caller waits, so that nothing
+// that a collector does, neither an exception nor never coming back, ends the run or reaches the caller. One object
+// serves one run.
 #pragma once
 
 #include <json/value.h>
@@ -15,6 +16,7 @@
 #include "systeminfo/collecting_settings.h"
 #include "systeminfo/collection_manifest.h"
 #include "systeminfo/collector.h"
+#include "systeminfo/collector_thread.h"
 
 namespace systeminfo {
 
@@ -26,7 +28,7 @@ enum RunCode : int {
   kRunNoWmi = 5,
 };
 
-// Called on the run's thread after each collector: (1, n) to (n, n).
+// Called on the caller's thread after each collector: (1, n) to (n, n).
 using ProgressCallback = std::function<void(int current, int total)>;
 
 struct PlannedCollector {
@@ -37,7 +39,10 @@ using CollectorList = std::vector<PlannedCollector>;
 
 class DataCollectorImpl {
  public:
-  explicit DataCollectorImpl(std::shared_ptr<CollectingSettings> settings);  // not null
+  // `settings` is not null. A collector may take as long as they say; then it has the grace of `limits` to end with
+  // what it has gathered, and is left behind when it does not.
+  explicit DataCollectorImpl(std::shared_ptr<CollectingSettings> settings, WmiMaker connect = &ConnectToWmi,
+                             const TimeLimits& limits = {});
 
   // Runs all enabled collectors. `cancel` may be null, and another thread may set it; `progress` may be empty.
   int CollectAll(const std::atomic<bool>* cancel, const ProgressCallback& progress);
@@ -66,6 +71,8 @@ class DataCollectorImpl {
 
  private:
   std::shared_ptr<CollectingSettings> m_settings;
+  const WmiMaker m_connect;
+  TimeLimits m_limits;
   std::vector<CollectorOutcome> m_outcomes;
 };
 

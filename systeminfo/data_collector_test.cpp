@@ -5,12 +5,12 @@
 #include <gmock/gmock.h>
 
 #include <stdexcept>
-#include <thread>
 
 #include "core/json.h"
 #include "core/logging.h"
 #include "systeminfo/collector_table.h"
 #include "systeminfo/wmi_wrapper.h"
+#include "tests/support/fake_collector.h"
 #include "tests/support/test_folder.h"
 
 namespace systeminfo {
@@ -21,30 +21,6 @@ using testing::ElementsAre;
 using testing::EndsWith;
 using testing::IsEmpty;
 using testing::Pair;
-
-// A collector whose Start is a function of the test.
-class FakeCollector : public ICollector {
- public:
-  using Body = std::function<Json::Value(WMIWrapper& wmi)>;
-  FakeCollector(std::wstring name, Body body) : ICollector(std::move(name)), m_body(std::move(body)) {}
-
-  void Start(const std::shared_ptr<CollectingSettings>& settings, const std::shared_ptr<WMIWrapper>& wmi,
-             const std::atomic<bool>*) override {
-    EXPECT_NE(settings, nullptr);
-    m_data = m_body(*wmi);
-  }
-
- private:
-  Body m_body;
-};
-
-PlannedCollector Fake(std::wstring name, FakeCollector::Body body) {
-  return {std::make_shared<FakeCollector>(std::move(name), std::move(body)), L"Fake"};
-}
-
-PlannedCollector Fake(std::wstring name, Json::Value data) {
-  return Fake(std::move(name), [data = std::move(data)](WMIWrapper&) { return data; });
-}
 
 class Run : public testing::Test {
  protected:
@@ -120,12 +96,12 @@ TEST_F(Run, CollectorWithoutDataWritesNoFileAndCountsAsProgress) {
 }
 
 TEST_F(Run, WhatACollectorWithoutDataSaidLastIsItsReason) {
-  const auto silent = std::make_shared<FakeCollector>(L"silent", [](WMIWrapper&) {
+  const auto silent = Fake(L"silent", [](WMIWrapper&) {
     LOG_WARNING(L"Start", L"the door is closed");
     LOG_TRACE(L"Start", L"there is no product");
     return Json::Value();
   });
-  EXPECT_EQ(Collect({{silent, L"FakeCollector"}, Fake(L"none", Json::Value())}), 0);
+  EXPECT_EQ(Collect({silent, Fake(L"none", Json::Value())}), 0);
   EXPECT_EQ(m_runner.Outcomes()[0].reason, L"Start: there is no product");
   EXPECT_EQ(m_runner.Outcomes()[1].reason, L"nothing was found");
 }
@@ -245,11 +221,8 @@ TEST_F(Run, SettingsWithoutAUsableOutputFolderAreRefused) {
 }
 
 TEST_F(Run, WmiThatCannotBeStartedEndsTheRunAfterTheFolder) {
-  // A thread of another apartment cannot enter the one that WMI needs.
-  std::thread([this] {
-    ASSERT_EQ(CoInitializeEx(nullptr, COINIT_APARTMENTTHREADED), S_OK);
-    EXPECT_EQ(Collect({Fake(L"one", Json::Value(1))}), 5);
-  }).join();
+  DataCollectorImpl runner(m_settings, [] { return nullptr; });
+  EXPECT_EQ(runner.RunCollectors(&m_cancel, nullptr, {Fake(L"one", Json::Value(1))}), 5);
   EXPECT_TRUE(FolderExists(m_output));
   EXPECT_EQ(File(L"one"), "");
   EXPECT_THAT(m_log.Take(),

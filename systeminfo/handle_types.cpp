@@ -6,6 +6,7 @@
 #include <system_error>
 #include <thread>
 
+#include "core/abandoned_threads.h"
 #include "core/logging.h"
 #include "systeminfo/handle_table.h"
 
@@ -62,6 +63,7 @@ size_t Await(Job& job, std::chrono::milliseconds limit) {
     if (isFinished) return done;
     if (done == before) {
       job.isGivenUp = true;
+      NoteAbandonedThread();
       return done;
     }
     before = done;

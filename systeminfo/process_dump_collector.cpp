@@ -6,6 +6,7 @@
 #include "core/files.h"
 #include "core/format.h"
 #include "core/logging.h"
+#include "core/own_files.h"
 #include "core/paths.h"
 #include "core/text.h"
 #include "systeminfo/collecting_settings.h"
@@ -25,8 +26,7 @@ void LogNotCreated(const std::wstring& path, DWORD error) {
 // The dump under its temporary name. False when the file was not created, or is not whole.
 bool WritePartialDump(HANDLE process, uint32_t processId, const std::wstring& path) {
   const std::wstring partial = ExtendedPath(path) + kPartialSuffix;
-  const KernelHandle file(CreateFileW(partial.c_str(), GENERIC_READ | GENERIC_WRITE, 0, nullptr, CREATE_ALWAYS,
-                                      FILE_ATTRIBUTE_NORMAL, nullptr));
+  const KernelHandle file = CreateFreshFile(partial.c_str(), GENERIC_READ | GENERIC_WRITE, 0);
   if (!file) {
     LogNotCreated(path, GetLastError());
     return false;

@@ -7,7 +7,7 @@ namespace systeminfo {
 namespace {
 
 constexpr size_t kFarthest = 2;
-constexpr const char* kRunKeys[] = {"output_folder", "pretty_print", "all_collectors"};
+constexpr const char* kRunKeys[] = {"output_folder", "pretty_print", "all_collectors", "collector_timeout"};
 
 char Lower(char c) {
   return c >= 'A' && c <= 'Z' ? static_cast<char>(c - 'A' + 'a') : c;

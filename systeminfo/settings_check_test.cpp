@@ -12,7 +12,7 @@ const std::vector<std::string> kCollectors = {"system_summary", "storage", "netw
 TEST(UnknownKeys, EnabledKeysThatNameNothingAreFoundWithTheNearestName) {
   Json::Value document;
   std::string error;
-  ASSERT_TRUE(ParseJson(R"({"output_folder":"x", "pretty_print":true, "all_collectors":false,
+  ASSERT_TRUE(ParseJson(R"({"output_folder":"x", "pretty_print":true, "all_collectors":false, "collector_timeout":5,
                             "storage":true, "network":false, "printers":[],
                             "systen_summary":true, "Storage":true, "prety_print":true, "registry":["a"],
                             "networks":null, "left_out":false})",

@@ -1,5 +1,7 @@
 #include "systeminfo/settings_document.h"
 
+#include <cmath>
+
 #include "core/json.h"
 
 namespace systeminfo {
@@ -26,6 +28,16 @@ const Json::Value* FindSetting(const Json::Value& document, std::string_view key
 bool IsSettingTrue(const Json::Value& document, std::string_view key) {
   const Json::Value* value = FindSetting(document, key);
   return value != nullptr && value->isBool() && value->asBool();
+}
+
+std::optional<std::chrono::milliseconds> CollectorTimeout(const Json::Value& document) {
+  const Json::Value* const member = FindSetting(document, "collector_timeout");
+  if (member == nullptr) return kDefaultCollectorTimeout;
+  if (!member->isNumeric() || member->isBool()) return std::nullopt;
+  const double seconds = member->asDouble();
+  if (!(seconds >= 0 && seconds <= static_cast<double>(kLongestCollectorTimeout.count()))) return std::nullopt;
+  constexpr int kMilliseconds = 1000;
+  return std::chrono::milliseconds(static_cast<int64_t>(std::ceil(seconds * kMilliseconds)));  // only 0 becomes 0
 }
 
 bool IsCollectorEnabled(const Json::Value& document, std::string_view key) {

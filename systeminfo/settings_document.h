@@ -5,7 +5,9 @@
 
 #include <json/value.h>
 
+#include <chrono>
 #include <cstdint>
+#include <optional>
 #include <string>
 #include <string_view>
 
@@ -24,6 +26,13 @@ const Json::Value* FindSetting(const Json::Value& document, std::string_view key
 
 // True only when the member exists and is boolean true.
 bool IsSettingTrue(const Json::Value& document, std::string_view key);
+
+inline constexpr std::chrono::seconds kDefaultCollectorTimeout = std::chrono::minutes(10);
+inline constexpr std::chrono::seconds kLongestCollectorTimeout = std::chrono::hours(24 * 7);
+
+// How long one collector may take: the member "collector_timeout", in seconds, 0 for as long as it takes. The default
+// when there is no such member; nothing when it is no number from 0 to the longest.
+std::optional<std::chrono::milliseconds> CollectorTimeout(const Json::Value& document);
 
 // Whether the collector of the settings key `key` runs. Loose on purpose, so that a key can carry the collector's own
 // parameters instead of true: any value but boolean false enables it, null included. "all_collectors", when boolean

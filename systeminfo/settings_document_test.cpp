@@ -52,6 +52,30 @@ TEST(SettingsDocument, OnlyBooleanTrueIsTrue) {
   EXPECT_FALSE(IsSettingTrue(Json::Value("text"), "t"));
 }
 
+TEST(SettingsDocument, CollectorTimeoutIsANumberOfSecondsWithinItsRange) {
+  using std::chrono::milliseconds;
+  struct {
+    const char* document;
+    std::optional<milliseconds> timeout;
+  } const rows[] = {
+      {R"({})", milliseconds(600'000)},
+      {R"({"collector_timeout":0})", milliseconds(0)},
+      {R"({"collector_timeout":0.0001})", milliseconds(1)},
+      {R"({"collector_timeout":1.5})", milliseconds(1500)},
+      {R"({"collector_timeout":604800})", milliseconds(604'800'000)},
+      {R"({"collector_timeout":604801})", std::nullopt},
+      {R"({"collector_timeout":-1})", std::nullopt},
+      {R"({"collector_timeout":1e300})", std::nullopt},
+      {R"({"collector_timeout":18446744073709551615})", std::nullopt},
+      {R"({"collector_timeout":"60"})", std::nullopt},
+      {R"({"collector_timeout":true})", std::nullopt},
+      {R"({"collector_timeout":null})", std::nullopt},
+  };
+  for (const auto& row : rows)
+    EXPECT_EQ(CollectorTimeout(Document(row.document)), row.timeout) << row.document;
+  EXPECT_EQ(CollectorTimeout(Json::Value()), milliseconds(kDefaultCollectorTimeout));
+}
+
 TEST(SettingsDocument, CollectorIsEnabledByAnythingButFalse) {
   struct {
     const char* document;

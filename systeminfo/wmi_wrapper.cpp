@@ -9,6 +9,7 @@ namespace {
 
 constexpr wchar_t kInit[] = L"WMIWrapper::Init";
 constexpr wchar_t kExecuteQuery[] = L"WMIWrapper::ExecuteQuery";
+constexpr LONG kStopPoll = 250;  // milliseconds between two looks whether to stop waiting
 
 // Logs a failed step of Init; `format` takes the status.
 bool Succeeded(HRESULT status, const wchar_t* format) {
@@ -78,6 +79,16 @@ bool WMIWrapper::Connect() {
                    L"Could not set proxy blanket. Error code = %x");
 }
 
+// Waits for the next instance without a limit, but in steps when somebody may want it to stop.
+HRESULT WMIWrapper::Next(IEnumWbemClassObject& instances, ComPtr<IWbemClassObject>& instance, ULONG& returned) const {
+  HRESULT status = WBEM_S_NO_ERROR;
+  do {
+    status = instances.Next(m_stop == nullptr ? static_cast<LONG>(WBEM_INFINITE) : kStopPoll, 1, instance.Receive(),
+                            &returned);
+  } while (status == WBEM_S_TIMEDOUT && m_stop != nullptr && !*m_stop);
+  return status;
+}
+
 int WMIWrapper::VisitInstances(const std::wstring& query, bool onlyFirst, const InstanceVisitor& visit) {
   if (!m_services) {
     LOG_ERROR(kExecuteQuery, L"Invalid pSvc pointer; query %s", query.c_str());
@@ -91,7 +102,7 @@ int WMIWrapper::VisitInstances(const std::wstring& query, bool onlyFirst, const 
   while (SUCCEEDED(status) && instances) {
     ComPtr<IWbemClassObject> instance;
     ULONG returned = 0;
-    status = instances->Next(WBEM_INFINITE, 1, instance.Receive(), &returned);
+    status = Next(*instances.Get(), instance, returned);
     if (FAILED(status) || returned == 0 || !instance) break;
     visit(*instance.Get());
     if (onlyFirst) break;

@@ -9,6 +9,7 @@
 #include <json/value.h>
 #include <wbemidl.h>
 
+#include <atomic>
 #include <functional>
 #include <map>
 #include <string>
@@ -42,6 +43,10 @@ class WMIWrapper {
   // when the process had set its security before; every query fails then.
   int Init();
 
+  // From now on a query that waits for WMI is given up, as failed, soon after `stop` was set; the rows that came before
+  // are kept. `stop` outlives the wrapper.
+  void StopWaitingWhen(const std::atomic<bool>& stop) { m_stop = &stop; }
+
   // The three forms return 0 on success, also when nothing matched, and 1 when the query failed. A failure on the way
   // keeps the rows that came before it. A property that cannot be read is left out of its row, so a row of a table may
   // be shorter than `names`.
@@ -55,11 +60,13 @@ class WMIWrapper {
 
  private:
   bool Connect();
+  HRESULT Next(IEnumWbemClassObject& instances, ComPtr<IWbemClassObject>& instance, ULONG& returned) const;
 
   using InstanceVisitor = std::function<void(IWbemClassObject& instance)>;
   int VisitInstances(const std::wstring& query, bool onlyFirst, const InstanceVisitor& visit);
 
   InitializeSecurity m_initializeSecurity = &CoInitializeSecurity;
+  const std::atomic<bool>* m_stop = nullptr;
   ComPtr<IWbemLocator> m_locator;
   ComPtr<IWbemServices> m_services;
 };

@@ -3,8 +3,8 @@
 #include <vector>
 
 #include "companions/crash/dump_name.h"
-#include "core/files.h"
 #include "core/folder_entries.h"
+#include "core/private_access.h"
 
 namespace crash {
 namespace {
@@ -13,20 +13,11 @@ uint64_t Ticks(const FILETIME& time) {
   return uint64_t{time.dwHighDateTime} << 32 | time.dwLowDateTime;
 }
 
-DWORD MakeFolder(const std::wstring& folder) {
-  if (FolderExists(folder)) return ERROR_SUCCESS;
-  if (const DWORD error = CreateFolders(folder.substr(0, folder.find_last_of(L'\\'))); error != ERROR_SUCCESS) {
-    return error;
-  }
-  const DWORD error = CreatePrivateFolder(folder);
-  return error == ERROR_ALREADY_EXISTS && FolderExists(folder) ? ERROR_SUCCESS : error;
-}
-
 }  // namespace
 
 PreparedFolder PrepareFolder(const std::wstring& folder, uint32_t keep) {
   PreparedFolder prepared;
-  prepared.error = MakeFolder(folder);
+  prepared.error = CreatePrivateFolders(folder);
   if (prepared.error != ERROR_SUCCESS) return prepared;
 
   const std::wstring start = folder + L"\\";

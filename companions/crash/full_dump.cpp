@@ -2,6 +2,7 @@
 
 #include <utility>
 
+#include "core/own_files.h"
 #include "core/scoped.h"
 
 namespace crash {
@@ -48,8 +49,7 @@ bool FullDump::Write(const CrashedThread& crashed) noexcept {
 }
 
 bool FullDump::WriteFileOf(MINIDUMP_TYPE type, const CrashedThread& crashed) noexcept {
-  const KernelHandle file(CreateFileW(m_path.PartialPath(), GENERIC_READ | GENERIC_WRITE, 0, nullptr, CREATE_ALWAYS,
-                                      FILE_ATTRIBUTE_NORMAL, nullptr));
+  const KernelHandle file = CreateFreshFile(m_path.PartialPath(), GENERIC_READ | GENERIC_WRITE, 0);
   if (!file) return false;
   MINIDUMP_EXCEPTION_INFORMATION exception{crashed.id, crashed.exception, FALSE};
   MINIDUMP_CALLBACK_INFORMATION progress{&OnProgress, &m_deadline};

@@ -10,6 +10,7 @@
 #include "core/delete_folder.h"
 #include "core/files.h"
 #include "core/format.h"
+#include "core/private_access.h"
 #include "core/text.h"
 
 namespace engine {

@@ -5,6 +5,7 @@
 
 #include "companions/log/log_line.h"
 #include "core/files.h"
+#include "core/own_files.h"
 
 namespace logfile {
 namespace {
@@ -93,9 +94,7 @@ DWORD LogFile::OpenAnySlot() {
 }
 
 DWORD LogFile::OpenSlot() {
-  // Without FILE_WRITE_DATA every write goes to the end. Others may read, but neither write nor delete.
-  KernelHandle file(CreateFileW(Path(0).c_str(), FILE_APPEND_DATA | FILE_READ_DATA | SYNCHRONIZE, FILE_SHARE_READ,
-                                nullptr, OPEN_ALWAYS, FILE_ATTRIBUTE_NORMAL, nullptr));
+  KernelHandle file = OpenForAppending(Path(0).c_str(), FILE_SHARE_READ);  // others neither write nor delete
   if (!file) return GetLastError();
   LARGE_INTEGER size{};
   if (!GetFileSizeEx(file.Get(), &size)) return GetLastError();

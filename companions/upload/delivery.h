@@ -4,7 +4,6 @@
 
 #include <cstdint>
 #include <map>
-#include <mutex>
 #include <string>
 #include <string_view>
 
@@ -14,6 +13,7 @@
 #include "companions/upload/upload_config.h"
 #include "companions/upload/upload_request.h"
 #include "companions/upload/upload_source.h"
+#include "core/lock.h"
 
 namespace qxlink {
 
@@ -56,7 +56,7 @@ class Delivery {
   const UploadConfig& m_config;
   const std::wstring m_libraryFolder;
   const CancelSignal& m_cancel;
-  std::mutex m_mutex;
+  SharedLock m_mutex;
   bool m_hasSentWaiting = false;               // guarded by m_mutex
   std::map<std::string, std::wstring> m_kept;  // what this object put into the outbox, by hash; guarded by m_mutex
 };

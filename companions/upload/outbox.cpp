@@ -9,6 +9,7 @@
 #include "core/json.h"
 #include "core/logging.h"
 #include "core/paths.h"
+#include "core/private_access.h"
 #include "core/text.h"
 
 namespace qxlink {

@@ -4,7 +4,6 @@
 #include <cstdint>
 #include <functional>
 #include <memory>
-#include <mutex>
 #include <string>
 #include <string_view>
 
@@ -13,6 +12,7 @@
 #include "companions/upload/upload_config.h"
 #include "companions/upload/upload_source.h"
 #include "companions/upload/worker.h"
+#include "core/lock.h"
 #include "core/logging.h"
 #include "interfaces/qxlink_api.h"
 
@@ -44,7 +44,7 @@ struct QxskylaneContext {
   qxlink::UploadConfig m_config;
   qxlink::CancelSignal m_cancel;
   std::unique_ptr<qxlink::Delivery> m_delivery;
-  std::mutex m_optionMutex;
+  SharedLock m_optionMutex;
   qxlink::DeliveryOptions m_options;  // guarded by m_optionMutex
   qxlink::Worker m_worker;            // last: it uses the rest
 };

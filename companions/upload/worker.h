@@ -1,11 +1,11 @@
 // One thread that does jobs one after another, in the order in which they were given. It begins with the first.
 #pragma once
 
-#include <condition_variable>
 #include <deque>
 #include <functional>
-#include <mutex>
 #include <thread>
+
+#include "core/lock.h"
 
 namespace qxlink {
 
@@ -22,8 +22,8 @@ class Worker {
  private:
   void Run();
 
-  std::mutex m_mutex;
-  std::condition_variable m_changed;
+  SharedLock m_mutex;
+  Condition m_changed;
   std::deque<std::function<void()>> m_jobs;  // guarded by m_mutex
   bool m_isEnding = false;                   // guarded by m_mutex
   std::thread m_thread;

@@ -27,11 +27,11 @@ class FakeEnumerator : public WbemEnumeratorStub {
  public:
   FakeEnumerator(Answer answer, int& nextCalls) : m_answer(std::move(answer)), m_nextCalls(nextCalls) {}
 
-  HRESULT STDMETHODCALLTYPE Next(LONG, ULONG count, IWbemClassObject** objects, ULONG* returned) override {
+  HRESULT STDMETHODCALLTYPE Next(LONG milliseconds, ULONG count, IWbemClassObject** objects, ULONG* returned) override {
     EXPECT_EQ(count, 1u);
     ++m_nextCalls;
     *returned = 0;
-    if (m_next == m_answer.instances.size()) return m_answer.endStatus;
+    if (m_next == m_answer.instances.size()) return m_answer.end ? m_answer.end(milliseconds) : m_answer.endStatus;
     *objects = new FakeObject(m_answer.instances[m_next++]);
     *returned = 1;
     return WBEM_S_NO_ERROR;
@@ -52,7 +52,8 @@ class FakeServices : public WbemServicesStub {
     EXPECT_STREQ(language, L"WQL");
     EXPECT_EQ(flags, WBEM_FLAG_FORWARD_ONLY | WBEM_FLAG_RETURN_IMMEDIATELY);
     m_wmi.queries.emplace_back(query);
-    const Answer& answer = m_wmi.answers[query];
+    const Answer answer = m_wmi.answers[query];
+    if (answer.whenQueried) answer.whenQueried();
     if (SUCCEEDED(answer.queryStatus) && answer.hasEnumerator)
       *enumerator = new FakeEnumerator(answer, m_wmi.nextCalls);
     return answer.queryStatus;

@@ -26,6 +26,9 @@ struct Answer {
   bool hasEnumerator = true;
   std::vector<Instance> instances;
   HRESULT endStatus = WBEM_S_FALSE;  // of the Next behind the last instance
+  // For a peer that does not answer: called by ExecQuery, and in the place of endStatus with Next's time limit.
+  std::function<void()> whenQueried;
+  std::function<HRESULT(LONG milliseconds)> end;
 };
 
 Property Text(std::wstring text);
