@@ -1,17 +1,15 @@
 """The engine (sciter.dll) with a real browser on a virtual screen: engine_host.exe is the window."""
-import glob
 import os
 import pathlib
 import shutil
 import signal
-import subprocess
 import sys
 import tempfile
 import time
 import unittest
 
 sys.path.insert(0, str(pathlib.Path(__file__).resolve().parents[1] / "support"))
-from browsers import browser_processes, processor_seconds  # noqa: E402
+from browsers import browser_processes, processor_seconds, profiles_in_use  # noqa: E402
 from engine_host import EngineHost, windows_path  # noqa: E402
 from x_session import XSession  # noqa: E402
 
@@ -38,10 +36,6 @@ def at(x, y):
     return y << 16 | x
 
 
-def profiles():
-    return glob.glob("/tmp/st-engine-*")
-
-
 class EngineTest(unittest.TestCase):
     @classmethod
     def setUpClass(cls):
@@ -50,6 +44,7 @@ class EngineTest(unittest.TestCase):
         cls.addClassCleanup(cls.session.__exit__)
 
     def setUp(self):
+        self.seen = set()
         self._folder = tempfile.TemporaryDirectory(prefix="st_engine_test_")
         self.addCleanup(self._folder.cleanup)
         self.folder = pathlib.Path(self._folder.name) / "pages 100%"
@@ -59,11 +54,16 @@ class EngineTest(unittest.TestCase):
     def browsers(self):
         return browser_processes(self.session)
 
+    def profiles(self):
+        """The profile folders that there are, of the browsers that were seen in this case."""
+        self.seen |= profiles_in_use(self.session)
+        return [path for path in self.seen if path.exists()]
+
     def gone_within(self, seconds):
         deadline = time.monotonic() + seconds
-        while time.monotonic() < deadline and (self.browsers() or profiles()):
+        while time.monotonic() < deadline and (self.browsers() or self.profiles()):
             time.sleep(0.2)
-        return not self.browsers() and not profiles()
+        return not self.browsers() and not self.profiles()
 
     def open(self, script, *arguments, page=PAGE):
         (self.folder / "index.htm").write_text(page.replace("SCRIPT", script), encoding="utf-8")
@@ -222,11 +222,11 @@ class EngineTest(unittest.TestCase):
     def test_closing_ends_the_browser_and_deletes_its_profile(self):
         host = self.open("")
         host.wait_for("shown")
-        self.assertTrue(self.browsers() and profiles())
+        self.assertTrue(self.browsers() and self.profiles())
         host.send("close")
         host.wait_for("engine destroyed")
         self.assertEqual(host.wait(), 0)
-        self.assertTrue(self.gone_within(6), (self.browsers(), profiles()))
+        self.assertTrue(self.gone_within(6), (self.browsers(), self.profiles()))
 
     def test_page_may_close_its_window_in_a_call(self):
         host = self.open("setTimeout(() => { view.closeWindow(); view.echo(1); }, 300)")
@@ -239,13 +239,15 @@ class EngineTest(unittest.TestCase):
     def test_killed_host_leaves_no_browser(self):
         host = self.open("")
         host.wait_for("shown")
+        self.assertTrue(self.profiles())
         host.send("abort")
         self.assertEqual(host.wait(), 3)
-        self.assertTrue(self.gone_within(40), (self.browsers(), profiles()))
+        self.assertTrue(self.gone_within(40), (self.browsers(), self.profiles()))
 
     def test_browser_that_dies_is_reported(self):
         host = self.open("function add(a) { return a; }")
         host.wait_for("shown")
+        left = self.profiles()
         for pid in self.browsers():
             try:
                 os.kill(pid, signal.SIGKILL)
@@ -255,8 +257,9 @@ class EngineTest(unittest.TestCase):
         self.assertTrue(host.ask("call add [1]", "called").startswith("0 "))
         host.send("close")
         host.wait_for("ended")
-        for path in profiles():  # its watch was killed too
-            shutil.rmtree(path, ignore_errors=True) if os.path.isdir(path) else os.remove(path)
+        for path in left:  # its watch was killed too
+            shutil.rmtree(path, ignore_errors=True)
+            path.with_name(path.name + ".life").unlink(missing_ok=True)
 
     def test_browser_that_is_none_is_reported(self):
         broken = self.folder / "broken"
@@ -279,8 +282,7 @@ class EngineTest(unittest.TestCase):
         host = self.open("")
         host.wait_for("shown")
         time.sleep(3)
-        pids = self.browsers() + [int(pid) for pid in subprocess.run(
-            ["pgrep", "-f", "engine_host.exe"], capture_output=True, text=True, check=False).stdout.split()]
+        pids = [host.process.pid, *self.browsers()]
         before = processor_seconds(pids)
         time.sleep(10)
         share = (processor_seconds(pids) - before) / 10
