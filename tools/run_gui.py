@@ -80,7 +80,6 @@ def main(release, run_folder, pictures):
     if os.environ.get("DISPLAY"):
         show(run_folder)
         return
-    shutil.rmtree(pictures, ignore_errors=True)
     has_server = shutil.which("node") and (PROJECT / "tools/ingest/node_modules").exists()
     print(f"== no display: on a virtual screen, reports go to {'a server on loopback' if has_server else 'an outbox'}")
     with contextlib.ExitStack() as stack:

@@ -388,6 +388,9 @@ std::optional<LRESULT> View::OnFrameMessage(UINT message, WPARAM wparam, LPARAM 
     case WM_KILLFOCUS:
       if (m_session != nullptr) m_session->SetFocus(message == WM_SETFOCUS);
       return {};
+    case WM_MOUSELEAVE:
+      OnMouseLeave();
+      return {};
     case WM_SETCURSOR:
       return OnCursor(lparam) ? std::optional<LRESULT>(TRUE) : std::nullopt;
     // A layered window has no frame of the system's: all of it is the page.

@@ -73,6 +73,7 @@ class View : public PageHost, public std::enable_shared_from_this<View> {
   void Present();
   void PaintWindow();
   std::optional<LRESULT> OnMouse(UINT message, WPARAM wparam, LPARAM lparam);
+  void OnMouseLeave();
   std::optional<LRESULT> OnKey(UINT message, WPARAM wparam, LPARAM lparam);
   std::optional<LRESULT> OnFrameMessage(UINT message, WPARAM wparam, LPARAM lparam);
   bool OnClipboardKey(WPARAM key);

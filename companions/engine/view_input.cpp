@@ -34,6 +34,10 @@ bool IsPress(UINT message) {
 
 std::optional<LRESULT> View::OnMouse(UINT message, WPARAM wparam, LPARAM lparam) {
   if (m_session == nullptr) return {};
+  if (message == WM_MOUSEMOVE) {
+    TRACKMOUSEEVENT leaving{sizeof leaving, TME_LEAVE, m_window, 0};
+    TrackMouseEvent(&leaving);
+  }
   // The system repeats moves that are none, after windows have changed.
   if (message == WM_MOUSEMOVE && std::exchange(m_lastMove, lparam) == lparam) return 0;
   POINT point{GET_X_LPARAM(lparam), GET_Y_LPARAM(lparam)};
@@ -51,6 +55,13 @@ std::optional<LRESULT> View::OnMouse(UINT message, WPARAM wparam, LPARAM lparam)
   if (event.isNull()) return {};
   m_session->SendInput("Input.dispatchMouseEvent", event);
   return 0;
+}
+
+// What was under the mouse must not stay highlighted.
+void View::OnMouseLeave() {
+  m_lastMove = -1;
+  if (m_session == nullptr) return;
+  m_session->SendInput("Input.dispatchMouseEvent", ToMouseEvent({WM_MOUSEMOVE, 0, -1, -1, 0, CurrentModifiers()}));
 }
 
 std::optional<LRESULT> View::OnKey(UINT message, WPARAM wparam, LPARAM lparam) {

@@ -386,8 +386,7 @@ class EngineTest(unittest.TestCase):
         host = self.open("")
         host.wait_for("shown")
         time.sleep(3)
-        pids = self.traces.processes() + [int(pid) for pid in subprocess.run(
-            ["pgrep", "-f", "engine_host.exe"], capture_output=True, text=True, check=False).stdout.split()]
+        pids = [host.process.pid, *self.traces.processes()]
         before = processor_seconds(pids)
         time.sleep(10)
         share = (processor_seconds(pids) - before) / 10

@@ -181,7 +181,7 @@ class WindowTest(unittest.TestCase):
         self.assertEnded(window)
 
     def test_starting_input_and_waiting_take_little(self):
-        """The best of several counts: the others say what else the machine had to do."""
+        # The best of several counts: the others say what else the machine had to do.
         window = self.open()
         print(f"painted {min(self.painted):.2f} s after the start", file=sys.stderr)
         self.assertLess(min(self.painted), 3)

@@ -1,5 +1,6 @@
 """Leads a report through the pages of the interactive mode, step by step, and keeps a picture of each."""
 import dataclasses
+import shutil
 
 LANGUAGES = {"en": "english", "ro": "romana"}  # as the installer calls them
 SUCCESS_LIMIT = 90  # seconds for collecting, packing and sending
@@ -33,13 +34,15 @@ def choose_language(program_folder, code):
 
 
 class ReportWalk:
-    """`pictures` is the folder for the pictures, or None for none."""
+    """`pictures` is the folder for the pictures, made anew, or None for none."""
 
     def __init__(self, window, answers, pictures=None):
         self.window = window
         self.answers = answers
         self._pictures = pictures
         self._count = 0
+        if pictures:
+            shutil.rmtree(pictures, ignore_errors=True)
 
     def picture(self, name):
         self._count += 1

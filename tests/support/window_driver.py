@@ -181,7 +181,7 @@ class Window:
 
     def press(self):
         """Clicks where the mouse is."""
-        self._xdotool("click", 1)
+        self._xdotool("click", "--delay", 0, 1)  # otherwise it waits for a tenth of a second afterwards
 
     def type(self, text, delay=15):
         # A key that needs AltGr must be read before AltGr is up again.
