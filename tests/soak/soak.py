@@ -6,7 +6,8 @@
 First N collections in a row of everything but process dumps, each packed, encrypted and put into an outbox; then M minutes
 of monitoring with P pairs of a counter and a trigger. After each collection, and at equal steps of the monitoring, the
 process rests while its handles, threads and private bytes are read. The first fifth is warm-up; what comes after must
-not grow: the medians of its first and its last third are compared. Exit code 1 when they do.
+not grow: the median of its last third is compared with the peak of the warm-up and the first third. Exit code 1 when it
+does.
 """
 import argparse
 import json
@@ -70,7 +71,8 @@ def judge(title, samples):
     for name in samples[-1]:
         values = [sample.get(name, 0) for sample in measured]
         begin, end = statistics.median(values[:third]), statistics.median(values[-third:])
-        grows = end - begin > TOLERANCE.get(name, TOLERANCE["handles"])
+        peak = max(sample.get(name, 0) for sample in samples[:len(samples) - len(measured) + third])
+        grows = end - peak > TOLERANCE.get(name, TOLERANCE["handles"])
         if name not in TOLERANCE and not grows:
             continue
         is_flat &= not grows
