@@ -112,11 +112,20 @@ int32_t AskLater(QxskylaneContext* context, QxskylaneDone done, void* user, bool
   });
 }
 
+// From now on the library stays loaded until the process ends, however often it is let go: a run-time library that is
+// linked into a library, as GCC's is, leaves handles and memory behind with every unloading.
+void StayLoaded() {
+  HMODULE self = nullptr;
+  GetModuleHandleExW(GET_MODULE_HANDLE_EX_FLAG_PIN | GET_MODULE_HANDLE_EX_FLAG_FROM_ADDRESS,
+                     reinterpret_cast<const wchar_t*>(&StayLoaded), &self);
+}
+
 }  // namespace
 
 int32_t qxskylane_init(QxskylaneContext** context) {
   if (context == nullptr) return QXSKYLANE_BAD_ARGUMENT;
   *context = nullptr;
+  StayLoaded();
   return Guarded([&] {
     auto made = std::make_unique<QxskylaneContext>();
     const int32_t result = made->Configure(OwnModuleFolder());
