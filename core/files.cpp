@@ -36,18 +36,21 @@ std::wstring WithoutDots(std::wstring_view path, size_t rootLength) {
   return result;
 }
 
+// Empty when the system does not say it.
 std::wstring CurrentDirectory() {
   std::wstring folder(GetCurrentDirectoryW(0, nullptr), L'\0');
-  folder.resize(GetCurrentDirectoryW(static_cast<DWORD>(folder.size()), folder.data()));
+  const DWORD length = GetCurrentDirectoryW(static_cast<DWORD>(folder.size()), folder.data());
+  folder.resize(length < folder.size() ? length : 0);
   return folder;
 }
 
-// Grants the current user, the administrators and the system everything, and nobody else anything.
+// Grants the current user, the administrators and the system everything, and nobody else anything. Empty, with
+// GetLastError set, on failure: an empty text is a valid descriptor, too, and one that protects nothing.
 std::wstring PrivateFolderDescriptor() {
   KernelHandle token;
   if (!OpenProcessToken(GetCurrentProcess(), TOKEN_QUERY, token.Receive())) return {};
   DWORD size = 0;
-  GetTokenInformation(token.Get(), TokenUser, nullptr, 0, &size);
+  if (!GetTokenInformation(token.Get(), TokenUser, nullptr, 0, &size) && size == 0) return {};
   std::vector<std::byte> user(size);
   if (!GetTokenInformation(token.Get(), TokenUser, user.data(), size, &size)) return {};
   LocalMemory<wchar_t> sid;
@@ -97,8 +100,10 @@ std::wstring ExtendedPath(std::wstring_view path) {
     full.resize(GetFullPathNameW(name.c_str(), static_cast<DWORD>(full.size()), full.data(), nullptr));
     return ExtendPath(full, {});
   }
-  const bool isAbsolute = path.size() >= 3 && path[1] == L':';
-  return ExtendPath(path, isAbsolute ? std::wstring() : CurrentDirectory());
+  const bool isAbsolute = (path.size() >= 3 && path[1] == L':') || path.starts_with(L"\\\\");
+  if (isAbsolute) return ExtendPath(path, {});
+  const std::wstring folder = CurrentDirectory();
+  return folder.empty() ? std::wstring(path) : ExtendPath(path, folder);
 }
 
 std::wstring ShownPath(std::wstring_view extendedPath) {
@@ -125,6 +130,12 @@ std::wstring FinalPath(HANDLE file) {
 
 bool PathExists(std::wstring_view path) {
   return GetFileAttributesW(ExtendedPath(path).c_str()) != INVALID_FILE_ATTRIBUTES;
+}
+
+bool IsAbsent(std::wstring_view path) {
+  if (PathExists(path)) return false;
+  const DWORD error = GetLastError();
+  return error == ERROR_FILE_NOT_FOUND || error == ERROR_PATH_NOT_FOUND;
 }
 
 bool FolderExists(std::wstring_view path) {
@@ -213,9 +224,11 @@ DWORD PublishPartialFile(std::wstring_view path) {
 }
 
 DWORD CreatePrivateFolder(std::wstring_view path) {
+  const std::wstring text = PrivateFolderDescriptor();
+  if (text.empty()) return GetLastError();
   LocalMemory<void> descriptor;
-  if (!ConvertStringSecurityDescriptorToSecurityDescriptorW(PrivateFolderDescriptor().c_str(), SDDL_REVISION_1,
-                                                            descriptor.Receive(), nullptr)) {
+  if (!ConvertStringSecurityDescriptorToSecurityDescriptorW(text.c_str(), SDDL_REVISION_1, descriptor.Receive(),
+                                                            nullptr)) {
     return GetLastError();
   }
   SECURITY_ATTRIBUTES attributes{sizeof attributes, descriptor.Get(), FALSE};
