@@ -54,7 +54,7 @@ bool ClearOutputFolder(const std::wstring& folder) {
     LOG_ERROR(kScope, L"output folder '%s' is refused: %s", folder.c_str(), refusal.c_str());
     return false;
   }
-  if (FolderExists(folder) && !DeleteFolder(folder, true)) {
+  if (!IsAbsent(folder) && !DeleteFolder(folder, true)) {
     LOG_ERROR(kScope, L"the existing output folder %s could not be deleted", folder.c_str());
   }
   return true;  // a folder that is still there is the runner's to refuse
@@ -81,11 +81,14 @@ int Collect(const std::shared_ptr<CollectingSettings>& settings, const std::wstr
 }
 
 void DeleteArchive(const std::wstring& archive) {
-  if (!DeleteFileW(ExtendedPath(archive).c_str())) LOG_WARNING(kScope, L"Failed to delete generated zip file.");
+  if (DeleteFileW(ExtendedPath(archive).c_str())) return;
+  const DWORD error = GetLastError();
+  LOG_WARNING(kScope, L"Failed to delete generated zip file.");
+  LOG_WARNING(kScope, L"error %u", error);
 }
 
 void DeleteCollectedData(const std::wstring& folder) {
-  if (!FolderExists(folder)) return;
+  if (IsAbsent(folder)) return;
   if (DeleteFolder(folder, true)) {
     LOG_TRACE(kScope, L"Deleted folder with collected data");
   } else {

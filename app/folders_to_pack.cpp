@@ -91,9 +91,11 @@ std::wstring GetUserTempPath() {
 
 std::wstring CopyInstallLogs(const std::wstring& outputFolder) {
   std::wstring target(JoinPath(outputFolder, L"install_logs"));
-  if (FolderExists(target)) DeleteFolder(target, true);
+  if (!IsAbsent(target)) DeleteFolder(target, true);
   if (!CreateDirectoryW(ExtendedPath(target).c_str(), nullptr)) {
+    const DWORD error = GetLastError();
     LOG_ERROR(kCopyInstallLogs, L"can't create install logs folder");
+    LOG_ERROR(kCopyInstallLogs, L"error %u", error);
     return {};
   }
   LOG_TRACE(kCopyInstallLogs, L"install_logs folder %s", target.c_str());
@@ -104,7 +106,9 @@ std::wstring CopyInstallLogs(const std::wstring& outputFolder) {
   for (const std::wstring& file : files) {
     const std::wstring copy(JoinPath(target, LastPathComponent(file)));
     if (!CopyFileW(ExtendedPath(file).c_str(), ExtendedPath(copy).c_str(), FALSE)) {
+      const DWORD error = GetLastError();
       LOG_ERROR(kCopyInstallLogs, L"Failed to copy file from %s to %s ", file.c_str(), copy.c_str());
+      LOG_ERROR(kCopyInstallLogs, L"error %u", error);
     }
   }
   return target;

@@ -7,12 +7,14 @@
 #include <algorithm>
 
 #include "core/files.h"
+#include "core/logging.h"
 #include "core/paths.h"
 #include "core/program_path.h"
 #include "core/scoped.h"
 
 namespace {
 
+constexpr wchar_t kScope[] = L"st::OutputFolder";
 constexpr std::wstring_view kLocalPrefix = L"\\\\?\\";
 constexpr std::wstring_view kNetworkPrefix = L"\\\\?\\UNC\\";
 
@@ -92,15 +94,25 @@ std::wstring NormalFolder(std::wstring_view folder) {
   if (extended.find(L'\0') != std::wstring::npos) return extended;
   const KernelHandle handle = OpenForAttributes(extended, FILE_FLAG_BACKUP_SEMANTICS);
   std::wstring final = handle ? FinalPath(handle.Get()) : std::wstring();
+  if (final.empty()) {
+    const DWORD error = GetLastError();
+    if (handle || (error != ERROR_FILE_NOT_FOUND && error != ERROR_PATH_NOT_FOUND)) {
+      LOG_WARNING(kScope, L"the system does not say where %s leads, error %u", extended.c_str(), error);
+    }
+  }
   return final.starts_with(kLocalPrefix) ? final : extended;
 }
 
 bool IsFolderLink(std::wstring_view folder) {
   const KernelHandle handle =
       OpenForAttributes(ExtendedPath(folder), FILE_FLAG_BACKUP_SEMANTICS | FILE_FLAG_OPEN_REPARSE_POINT);
+  if (!handle) return false;
   FILE_ATTRIBUTE_TAG_INFO info{};
-  return handle && GetFileInformationByHandleEx(handle.Get(), FileAttributeTagInfo, &info, sizeof info) &&
-         (info.FileAttributes & FILE_ATTRIBUTE_REPARSE_POINT) != 0 && IsReparseTagNameSurrogate(info.ReparseTag);
+  if (!GetFileInformationByHandleEx(handle.Get(), FileAttributeTagInfo, &info, sizeof info)) {
+    LOG_ERROR(kScope, L"the folder does not say whether it is a link, error %u", GetLastError());
+    return true;
+  }
+  return (info.FileAttributes & FILE_ATTRIBUTE_REPARSE_POINT) != 0 && IsReparseTagNameSurrogate(info.ReparseTag);
 }
 
 std::vector<ProtectedFolder> ProtectedFolders() {
@@ -109,13 +121,18 @@ std::vector<ProtectedFolder> ProtectedFolders() {
   folders.push_back({NormalFolder(ProgramFolder()), L"the program's folder"});
   for (const KnownFolder& known : kKnownFolders) {
     TaskMemoryText path;
-    if (SUCCEEDED(SHGetKnownFolderPath(known.id, KF_FLAG_DONT_VERIFY, nullptr, path.Receive()))) {
+    const HRESULT status = SHGetKnownFolderPath(known.id, KF_FLAG_DONT_VERIFY, nullptr, path.Receive());
+    if (SUCCEEDED(status)) {
       folders.push_back({NormalFolder(path.Get()), known.what});
+    } else {
+      LOG_TRACE(kScope, L"the system does not name %s, error %x", known.what, static_cast<unsigned>(status));
     }
   }
   wchar_t temporary[MAX_PATH + 2] = {};
   if (GetTempPathW(MAX_PATH + 1, temporary) != 0) {
     folders.push_back({NormalFolder(temporary), L"the temporary folder"});
+  } else {
+    LOG_WARNING(kScope, L"the system does not name the temporary folder, error %u", GetLastError());
   }
   return folders;
 }

@@ -8,6 +8,7 @@
 
 #include "core/files.h"
 #include "core/folder_entries.h"
+#include "core/logging.h"
 #include "core/paths.h"
 
 namespace {
@@ -82,7 +83,7 @@ class TreeRemoval {
     Level level{m_path.size(), {}};
     m_path += L'\\';
     const std::wstring folder = m_path;
-    ForEachEntry(folder, [&](const WIN32_FIND_DATAW& entry) {
+    const DWORD error = ForEachEntry(folder, [&](const WIN32_FIND_DATAW& entry) {
       if (IsFolderOfTree(entry)) {
         level.subfolders.emplace_back(entry.cFileName);
       } else {
@@ -91,7 +92,10 @@ class TreeRemoval {
         m_isComplete &= Remove(IsFolder(entry) ? RemoveDirectoryW : DeleteFileW, m_path, m_force);
       }
       return true;
-    });  // what could not be listed keeps its folder from being removed
+    });
+    if (error != ERROR_SUCCESS && !IsAbsence(error)) {  // what was not listed keeps its folder from being removed
+      LOG_WARNING(L"DeleteFolder", L"%s cannot be listed, error %u", folder.c_str(), error);
+    }
     m_levels.push_back(std::move(level));
   }
 

@@ -3,6 +3,7 @@
 #include <array>
 
 #include "core/hex.h"
+#include "core/logging.h"
 
 namespace {
 
@@ -14,6 +15,7 @@ bool Succeeded(NTSTATUS status) {
 
 Digest::Digest(const wchar_t* algorithm) : m_library(L"bcrypt.dll") {
   m_isGood = Bind() && Open(algorithm) && Begin();
+  if (!m_isGood) LOG_WARNING(L"Digest::Digest", L"the system cannot compute a digest by %s", algorithm);
 }
 
 bool Digest::Bind() {

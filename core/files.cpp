@@ -36,9 +36,11 @@ std::wstring WithoutDots(std::wstring_view path, size_t rootLength) {
   return result;
 }
 
+// Empty when the system does not say it.
 std::wstring CurrentDirectory() {
   std::wstring folder(GetCurrentDirectoryW(0, nullptr), L'\0');
-  folder.resize(GetCurrentDirectoryW(static_cast<DWORD>(folder.size()), folder.data()));
+  const DWORD length = GetCurrentDirectoryW(static_cast<DWORD>(folder.size()), folder.data());
+  folder.resize(length < folder.size() ? length : 0);
   return folder;
 }
 
@@ -84,8 +86,10 @@ std::wstring ExtendedPath(std::wstring_view path) {
     full.resize(GetFullPathNameW(name.c_str(), static_cast<DWORD>(full.size()), full.data(), nullptr));
     return ExtendPath(full, {});
   }
-  const bool isAbsolute = path.size() >= 3 && path[1] == L':';
-  return ExtendPath(path, isAbsolute ? std::wstring() : CurrentDirectory());
+  const bool isAbsolute = (path.size() >= 3 && path[1] == L':') || path.starts_with(L"\\\\");
+  if (isAbsolute) return ExtendPath(path, {});
+  const std::wstring folder = CurrentDirectory();
+  return folder.empty() ? std::wstring(path) : ExtendPath(path, folder);
 }
 
 std::wstring ShownPath(std::wstring_view extendedPath) {
@@ -112,6 +116,12 @@ std::wstring FinalPath(HANDLE file) {
 
 bool PathExists(std::wstring_view path) {
   return GetFileAttributesW(ExtendedPath(path).c_str()) != INVALID_FILE_ATTRIBUTES;
+}
+
+bool IsAbsent(std::wstring_view path) {
+  if (PathExists(path)) return false;
+  const DWORD error = GetLastError();
+  return error == ERROR_FILE_NOT_FOUND || error == ERROR_PATH_NOT_FOUND;
 }
 
 bool FolderExists(std::wstring_view path) {

@@ -13,7 +13,7 @@
 // The form of a path that has no length limit and keeps trailing dots and spaces: absolute, with the prefix \\?\ (or
 // \\?\UNC\). Relative paths are resolved against the current directory, "." and ".." are removed, and "/" becomes "\".
 // Every function of this program that opens, lists or deletes by a path passes it through here. An empty path stays
-// empty.
+// empty, and a relative one as it is when the system does not name the current directory.
 std::wstring ExtendedPath(std::wstring_view path);
 
 // The same without asking the system; `currentDirectory` is absolute.
@@ -27,6 +27,8 @@ std::wstring FinalPath(HANDLE file);
 
 bool PathExists(std::wstring_view path);    // a file or a folder
 bool FolderExists(std::wstring_view path);  // a folder
+// The system says that there is nothing; PathExists is false, too, when it does not say what there is.
+bool IsAbsent(std::wstring_view path);
 
 // Opens an existing file for reading it from the beginning, and lets others do with it what they like meanwhile:
 // neither who writes a log nor who replaces a settings file by renaming is disturbed. Invalid, with GetLastError set,

@@ -126,3 +126,10 @@ TEST(Files, ExistenceTellsFilesFromFolders) {
   EXPECT_FALSE(FolderExists(file) || PathExists(folder.Path(L"missing")) || FolderExists(folder.Path(L"missing")));
   EXPECT_FALSE(PathExists(L"") || FolderExists(L""));
 }
+
+TEST(Files, OnlyWhatTheSystemCallsMissingIsAbsent) {
+  const TestFolder folder;
+  EXPECT_TRUE(IsAbsent(folder.Path(L"missing")) && IsAbsent(folder.Path(L"no\\parent")));
+  EXPECT_FALSE(IsAbsent(folder.Path()) || IsAbsent(folder.MakeFile(L"file")));
+  EXPECT_FALSE(IsAbsent(folder.Path(L"a|b<c>?")));  // no name at all: the system answers with another error
+}

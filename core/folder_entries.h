@@ -9,9 +9,13 @@
 
 #include "core/scoped.h"
 
+inline bool IsAbsence(DWORD error) {
+  return error == ERROR_FILE_NOT_FOUND || error == ERROR_PATH_NOT_FOUND;
+}
+
 // Calls `visit` (const WIN32_FIND_DATAW& -> bool, false ends) for every entry but "." and "..". `folder` is an
-// ExtendedPath that ends in a separator. Returns 0, or why the folder cannot be listed; one that vanishes meanwhile
-// just ends. The folder is closed on return.
+// ExtendedPath that ends in a separator. Returns 0, or why the folder cannot be listed, or not to its end; one that
+// vanishes meanwhile just ends. The folder is closed on return.
 template <class Visit>
 DWORD ForEachEntry(const std::wstring& folder, Visit visit) {
   WIN32_FIND_DATAW entry;
@@ -21,9 +25,10 @@ DWORD ForEachEntry(const std::wstring& folder, Visit visit) {
   if (!listing) return GetLastError();
   do {
     const std::wstring_view name = entry.cFileName;
-    if (name != L"." && name != L".." && !visit(static_cast<const WIN32_FIND_DATAW&>(entry))) break;
+    if (name != L"." && name != L".." && !visit(static_cast<const WIN32_FIND_DATAW&>(entry))) return ERROR_SUCCESS;
   } while (FindNextFileW(listing.Get(), &entry));
-  return ERROR_SUCCESS;
+  const DWORD error = GetLastError();
+  return error == ERROR_NO_MORE_FILES || IsAbsence(error) ? ERROR_SUCCESS : error;
 }
 
 inline bool IsFolder(const WIN32_FIND_DATAW& entry) {

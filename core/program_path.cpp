@@ -2,12 +2,17 @@
 
 #include <windows.h>
 
+#include "core/logging.h"
+
 namespace {
+
+constexpr wchar_t kScope[] = L"ModulePath";
 
 std::wstring ModulePath(HMODULE module) {
   constexpr DWORD kLongestPath = 32767;
   std::wstring path(kLongestPath + 1, L'\0');
   path.resize(GetModuleFileNameW(module, path.data(), kLongestPath + 1));
+  if (path.empty()) LOG_ERROR(kScope, L"the path of a module is not known, error %u", GetLastError());
   return path;
 }
 
@@ -28,7 +33,10 @@ std::wstring ProgramFolder() {
 
 std::wstring OwnModuleFolder() {
   HMODULE module = nullptr;
-  GetModuleHandleExW(GET_MODULE_HANDLE_EX_FLAG_FROM_ADDRESS | GET_MODULE_HANDLE_EX_FLAG_UNCHANGED_REFCOUNT,
-                     reinterpret_cast<LPCWSTR>(&OwnModuleFolder), &module);
+  if (!GetModuleHandleExW(GET_MODULE_HANDLE_EX_FLAG_FROM_ADDRESS | GET_MODULE_HANDLE_EX_FLAG_UNCHANGED_REFCOUNT,
+                          reinterpret_cast<LPCWSTR>(&OwnModuleFolder), &module)) {
+    LOG_ERROR(kScope, L"the own module is not known, error %u", GetLastError());
+    return {};  // without a module the program's own path would be asked for
+  }
   return FolderOf(ModulePath(module));
 }

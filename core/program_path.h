@@ -1,5 +1,5 @@
 // Where the running program, and the module that this code is linked into, lie. The values are fixed for the life of
-// the process.
+// the process. What the system does not say is logged, and empty.
 #pragma once
 
 #include <string>

@@ -6,6 +6,7 @@
 
 #include "core/files.h"
 #include "core/folder_entries.h"
+#include "core/logging.h"
 #include "core/paths.h"
 
 bool WalkDir(std::wstring_view root, const WalkDirEntryCallback& callback) {
@@ -22,7 +23,9 @@ bool WalkDir(std::wstring_view root, const WalkDirEntryCallback& callback) {
     path += folder;
     const size_t folderLength = path.size();
     bool isStopped = false;
+    bool isListed = false;
     const DWORD error = ForEachEntry(listedRoot + folder, [&](const WIN32_FIND_DATAW& entry) {
+      isListed = true;
       path.resize(folderLength);
       path += entry.cFileName;
       const WalkDir_Ret answer = callback(path, entry);
@@ -33,7 +36,13 @@ bool WalkDir(std::wstring_view root, const WalkDirEntryCallback& callback) {
       return !isStopped;
     });
     if (isStopped) return true;
-    if (error != ERROR_SUCCESS && folder.empty()) return false;
+    if (error == ERROR_SUCCESS) continue;
+    const bool isRoot = folder.empty();
+    if (!IsAbsence(error)) {  // what vanishes meanwhile, or never was there, is no failure
+      path.resize(folderLength);
+      LOG_WARNING(L"WalkDir", L"%s cannot be listed%s, error %u", path.c_str(), isListed ? L" to its end" : L"", error);
+    }
+    if (isRoot && !isListed) return false;
   }
   return true;
 }

@@ -26,6 +26,7 @@ using WalkDirAttributesCallback = std::function<WalkDir_Ret(const qx::PathString
 // a folder come in a row, before those of its subfolders; otherwise the order is open. A junction or symbolic link to a
 // folder is an entry like any other, but is not walked into, so that no walk goes in circles.
 // False only when the root is empty text or cannot be listed (the callback is never called then); a walk ended by
-// kWalkStop is true. The record has no short name.
+// kWalkStop is true. A folder that is there and cannot be listed, or not to its end, is logged. The record has no
+// short name.
 bool WalkDir(std::wstring_view root, const WalkDirEntryCallback& callback);
 bool WalkDir(std::wstring_view root, const WalkDirAttributesCallback& callback);

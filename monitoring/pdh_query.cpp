@@ -1,6 +1,7 @@
 #include <windows.h>
 
 #include <pdh.h>
+#include <pdhmsg.h>
 
 #include "core/scoped.h"
 #include "monitoring/counter_query.h"
@@ -24,10 +25,12 @@ class PdhQuery : public CounterQuery {
     return status;
   }
   int32_t AddCounter(const std::wstring& path) override {
+    if (!m_query) return kNoQuery;
     return static_cast<int32_t>(PdhAddCounterW(m_query.Get(), path.c_str(), 0, &m_counter));
   }
-  int32_t Collect() override { return static_cast<int32_t>(PdhCollectQueryData(m_query.Get())); }
+  int32_t Collect() override { return m_query ? static_cast<int32_t>(PdhCollectQueryData(m_query.Get())) : kNoQuery; }
   int32_t GetValue(double& value) override {
+    if (m_counter == INVALID_HANDLE_VALUE) return kNoQuery;
     PDH_FMT_COUNTERVALUE formatted{};
     const PDH_STATUS status = PdhGetFormattedCounterValue(m_counter, PDH_FMT_DOUBLE, nullptr, &formatted);
     if (status == ERROR_SUCCESS) value = formatted.doubleValue;
@@ -35,7 +38,9 @@ class PdhQuery : public CounterQuery {
   }
 
  private:
-  // What the system refuses as a bad handle until there are real ones.
+  // The system takes a handle for an address: one that is none is never handed over.
+  static constexpr int32_t kNoQuery = static_cast<int32_t>(PDH_INVALID_HANDLE);
+
   ScopedPdhQuery m_query{INVALID_HANDLE_VALUE};
   PDH_HCOUNTER m_counter = INVALID_HANDLE_VALUE;  // belongs to the query
 };

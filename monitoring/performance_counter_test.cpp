@@ -35,6 +35,14 @@ TEST(PerformanceCounter, ACounterThatTheSystemLacksLoadsAndNeverReads) {
   EXPECT_FALSE(MakeTrigger(L">=", -1e300).Evaluate(counter));
 }
 
+TEST(PerformanceCounter, AQueryThatIsNotOpenIsNeverHandedToTheSystem) {
+  const auto query = MakePdhQuery();
+  double value = 7;
+  EXPECT_LT(query->AddCounter(L"\\System\\System Up Time"), 0);
+  EXPECT_LT(query->Collect(), 0);
+  EXPECT_LT(query->GetValue(value), 0);
+}
+
 // Counters that every system has, also one that has few.
 TEST(PerformanceCounter, TheSystemsUptimeGrowsAndItsProcessorTimeIsANumber) {
   logging::ErrorCapture errors;

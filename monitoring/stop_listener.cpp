@@ -26,10 +26,10 @@ using ScopedWindow = Scoped<WindowTraits>;
 
 }  // namespace
 
-StopListener::StopListener(std::function<void()> stop, const wchar_t* eventName)
-    : m_stop(std::move(stop)),
-      m_stopEvent(CreateEventW(nullptr, FALSE, FALSE, eventName)),
-      m_done(CreateEventW(nullptr, TRUE, FALSE, nullptr)) {
+StopListener::StopListener(std::function<void()> stop, const wchar_t* eventName) : m_stop(std::move(stop)) {
+  m_done.Reset(CreateEventW(nullptr, TRUE, FALSE, nullptr));
+  if (!m_done) LOG_ERROR(kFunction, L"error creating event: %d", GetLastError());
+  m_stopEvent.Reset(CreateEventW(nullptr, FALSE, FALSE, eventName));
   if (!m_stopEvent) LOG_ERROR(kFunction, L"error creating event %s: %d", eventName, GetLastError());
   if (m_stopEvent) ResetEvent(m_stopEvent.Get());  // somebody's from before this run does not count
   {
@@ -38,14 +38,18 @@ StopListener::StopListener(std::function<void()> stop, const wchar_t* eventName)
   }
   // A windowed program has no console of its own. Without one there is no Ctrl-C either.
   m_ownsConsole = AttachConsole(ATTACH_PARENT_PROCESS) != FALSE;
-  SetConsoleCtrlHandler(&OnConsoleEvent, TRUE);
+  if (!SetConsoleCtrlHandler(&OnConsoleEvent, TRUE)) {
+    LOG_WARNING(kFunction, L"Ctrl-C will not be heard: %d", GetLastError());
+  }
   m_thread = std::thread([this] { Listen(); });
 }
 
 StopListener::~StopListener() {
   SetEvent(m_done.Get());
   m_thread.join();
-  SetConsoleCtrlHandler(&OnConsoleEvent, FALSE);
+  if (!SetConsoleCtrlHandler(&OnConsoleEvent, FALSE)) {
+    LOG_WARNING(kFunction, L"the console's events are still heard: %d", GetLastError());
+  }
   const std::lock_guard lock(g_lock);  // waits for a console event that is being handled
   g_listener = nullptr;
   if (m_ownsConsole) FreeConsole();
@@ -80,7 +84,9 @@ void StopListener::Listen() {
   windowClass.lpfnWndProc = &OnWindowMessage;
   windowClass.hInstance = GetModuleHandleW(nullptr);
   windowClass.lpszClassName = kWindowClass;
-  RegisterClassW(&windowClass);
+  if (RegisterClassW(&windowClass) == 0 && GetLastError() != ERROR_CLASS_ALREADY_EXISTS) {
+    LOG_WARNING(kFunction, L"no window class: %d", GetLastError());
+  }
   // A top-level window: message-only ones hear nothing of the session's end.
   const ScopedWindow window(
       CreateWindowExW(0, kWindowClass, L"", WS_POPUP, 0, 0, 0, 0, nullptr, nullptr, windowClass.hInstance, nullptr));

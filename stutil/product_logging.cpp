@@ -86,8 +86,12 @@ bool ProductLogging::Restore() const {
   std::string marker;
   const DWORD error = ReadWholeFile(m_marker, kLargestFile, marker);
   if (error == ERROR_FILE_NOT_FOUND || error == ERROR_PATH_NOT_FOUND) return true;
+  if (error != ERROR_SUCCESS && error != ERROR_FILE_TOO_LARGE) {  // it may be sound: the next start tries again
+    LOG_ERROR(kRestoreScope, L"the marker %s cannot be read, error %d", m_marker.c_str(), error);
+    return false;
+  }
   LOG_INFO(kRestoreScope, L"the product's logging was left raised and is put back [marker %s]", m_marker.c_str());
-  return error == ERROR_SUCCESS ? PutBack(marker) : PutBack({});
+  return PutBack(marker);
 }
 
 // Before the first change. A marker that is there already tells of the settings before an earlier activation: it stays.

@@ -153,6 +153,19 @@ TEST_F(ProductLoggingTest, DamagedMarkerEndsWithTheDescribedValues) {
   }
 }
 
+TEST_F(ProductLoggingTest, MarkerThatCannotBeReadStaysForTheNextStart) {
+  m_logging.Activate();
+  const std::string raised = Read(m_file);
+  {
+    const KernelHandle blocked(
+        CreateFileW(m_logging.MarkerPath().c_str(), GENERIC_READ, 0, nullptr, OPEN_EXISTING, 0, nullptr));
+    EXPECT_FALSE(m_logging.Restore());
+    EXPECT_EQ(Read(m_file), raised);
+  }
+  EXPECT_TRUE(m_logging.Restore());
+  EXPECT_EQ(Read(m_file), kLoggerXml);
+}
+
 TEST(RaisedLoggingMarker, SurvivesItsFile) {
   const RaisedLogging cases[] = {
       {{}, std::nullopt}, {{{"a", 1}, {"b", 4294967295u}}, std::string("\xFF\n\0{", 4)}, {{{"", 0}}, std::string()}};

@@ -40,7 +40,10 @@ struct ScopedZipArchive::Writer {
 };
 
 bool ScopedZipArchive::Writer::Open(std::wstring_view path) {
-  if (file.Create(path) != ERROR_SUCCESS) return false;
+  if (const DWORD error = file.Create(path); error != ERROR_SUCCESS) {
+    SetLastError(error);
+    return false;
+  }
   zip.m_pWrite = &Writer::Write;
   zip.m_pIO_opaque = this;
   return mz_zip_writer_init_v2(&zip, 0, 0) != MZ_FALSE;
@@ -64,16 +67,21 @@ bool ScopedZipArchive::Writer::AddData(const ZipEntry& entry, const void* data, 
 
 ScopedZipArchive::ScopedZipArchive(std::wstring_view archivePath) : m_writer(std::make_unique<Writer>()) {
   if (m_writer->Open(archivePath)) return;
+  const DWORD error = GetLastError();
   m_writer.reset();
-  LOG_ERROR(L"stutil::ScopedZipArchive::ScopedZipArchive", L"error creating zip file %s",
-            std::wstring(archivePath).c_str());
+  constexpr wchar_t kScope[] = L"stutil::ScopedZipArchive::ScopedZipArchive";
+  LOG_ERROR(kScope, L"error creating zip file %s", std::wstring(archivePath).c_str());
+  LOG_ERROR(kScope, L"error %u", error);
 }
 
 ScopedZipArchive::~ScopedZipArchive() {
   if (!m_writer) return;
-  const bool finalized = mz_zip_writer_finalize_archive(&m_writer->zip) != MZ_FALSE &&
-                         m_writer->file.Publish(m_writer->zip.m_archive_size) == ERROR_SUCCESS;
-  if (!finalized) LOG_ERROR(L"stutil::ScopedZipArchive::~ScopedZipArchive", L"error on archive finalize");
+  const bool isFinalized = mz_zip_writer_finalize_archive(&m_writer->zip) != MZ_FALSE;
+  const DWORD error = isFinalized ? m_writer->file.Publish(m_writer->zip.m_archive_size) : m_writer->file.Error();
+  if (isFinalized && error == ERROR_SUCCESS) return;
+  constexpr wchar_t kScope[] = L"stutil::ScopedZipArchive::~ScopedZipArchive";
+  LOG_ERROR(kScope, L"error on archive finalize");
+  LOG_ERROR(kScope, L"error %u", error);
 }
 
 bool ScopedZipArchive::IsOpen() const {

@@ -2,6 +2,8 @@
 
 #include <tuple>
 
+#include "core/logging.h"
+
 namespace stutil {
 namespace {
 
@@ -51,7 +53,9 @@ std::unique_ptr<SkylaneApi> LoadSkylaneApi() {
   api->library = DynamicLibrary(L"qxlink.dll");
   const bool isComplete =
       std::apply([&](const auto&... entries) { return (Bind(*api, entries) && ...); }, kEntryPoints);
-  return isComplete ? std::move(api) : nullptr;
+  if (isComplete) return api;
+  LOG_ERROR(L"stutil::LoadSkylaneApi", L"qxlink.dll cannot be loaded or is incomplete, error %u", GetLastError());
+  return nullptr;
 }
 
 }  // namespace stutil

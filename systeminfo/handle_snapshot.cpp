@@ -61,8 +61,10 @@ void ProcessHandlerHelper::GetHandleInformationForProcess(uint32_t processId, st
   if (!m_isValid) return;
   KernelHandle process(OpenProcess(PROCESS_ALL_ACCESS, FALSE, processId));
   if (!process) {
+    const DWORD error = GetLastError();
     LOG_TRACE(L"ProcessHandlerHelper::GetHandleInformationForProcess",
               L"Could not open PID %d!(Don't try to open a system process.)\n", static_cast<int>(processId));
+    LOG_TRACE(L"ProcessHandlerHelper::GetHandleInformationForProcess", L"error %u", error);
     return;
   }
   const auto values = m_table.HandlesOf(processId);

@@ -22,9 +22,11 @@ std::optional<std::wstring> TypeOf(const ObjectCalls& calls, HANDLE process, uin
   const HANDLE source = reinterpret_cast<HANDLE>(static_cast<uintptr_t>(value));
   if (calls.duplicate(process, source, GetCurrentProcess(), duplicate.Receive(), 0, 0, 0) < 0) return std::nullopt;
   alignas(8) std::array<char, kReplySize> reply{};
-  if (calls.query(duplicate.Get(), kObjectTypeInformation, reply.data(), static_cast<ULONG>(reply.size()), nullptr) <
-      0) {
+  const NTSTATUS status =
+      calls.query(duplicate.Get(), kObjectTypeInformation, reply.data(), static_cast<ULONG>(reply.size()), nullptr);
+  if (status < 0) {
     LOG_TRACE(kScope, L"Erorr m_ntQueryObject");
+    LOG_TRACE(kScope, L"status %x", static_cast<unsigned>(status));
     return std::nullopt;
   }
   const auto name =
@@ -79,6 +81,10 @@ std::vector<std::optional<std::wstring>> HandleTypeReader::Read(KernelHandle pro
   for (size_t first = 0; first < values.size() && m_givenUp < kMostGivenUp;) {
     const std::span<const uint16_t> rest = values.subspan(first);
     const auto job = std::make_shared<Job>();
+    if (!job->finished) {
+      LOG_ERROR(kScope, L"no event to wait for handles, error %u", GetLastError());
+      return types;
+    }
     job->calls = m_calls;
     job->process = shared;
     job->values.assign(rest.begin(), rest.end());

@@ -6,6 +6,8 @@
 namespace systeminfo {
 namespace {
 
+constexpr wchar_t kStart[] = L"systeminfo::InstalledSoftwareCollector::Start";
+
 constexpr const wchar_t* kLocations[] = {
     L"HKEY_LOCAL_MACHINE\\Software\\Wow6432Node\\Microsoft\\Windows\\CurrentVersion\\Uninstall",
     L"HKEY_LOCAL_MACHINE\\Software\\Microsoft\\Windows\\CurrentVersion\\Uninstall",
@@ -25,7 +27,9 @@ constexpr Fact kFacts[] = {
 
 void AppendPrograms(const utils::RegistryKey& location, Json::Value& programs) {
   location.WalkSubkeys([&](const std::wstring& name) {
-    const Json::Value values = utils::ValuesAsJson(location.OpenSubkey(name));
+    const utils::RegistryKey entry = location.OpenSubkey(name);
+    if (!entry) entry.LogUnlessAbsent(kStart, name);
+    const Json::Value values = utils::ValuesAsJson(entry);
     if (IsInstalledProgram(values)) programs.append(InstalledProgram(values));
     return true;
   });
@@ -37,7 +41,9 @@ void InstalledSoftwareCollector::Start(const std::shared_ptr<CollectingSettings>
                                        const std::atomic<bool>* cancel) {
   m_data = Json::Value(Json::arrayValue);
   for (const wchar_t* location : kLocations) {
-    AppendPrograms(utils::RegistryKey(location), m_data);
+    const utils::RegistryKey key(location);
+    if (!key) key.LogUnlessAbsent(kStart, location);
+    AppendPrograms(key, m_data);
     if (IsCancelled(cancel)) return;
   }
 }

@@ -17,6 +17,7 @@ constexpr const wchar_t* kUninstallKeys[] = {
 // A key that is not there is no error: not every machine has both.
 void AppendUpdates(const wchar_t* path, Json::Value& updates) {
   const utils::RegistryKey uninstall(HKEY_LOCAL_MACHINE, path);
+  if (!uninstall) uninstall.LogUnlessAbsent(L"systeminfo::InstalledUpdatesCollector::Start", path);
   uninstall.WalkSubkeys([&](const std::wstring& name) {
     const utils::RegistryKey entry = uninstall.OpenSubkey(name);
     if (!entry) {

@@ -152,7 +152,11 @@ bool ProcessCollector::IsSigned(const std::wstring& path) {
 
 std::wstring ProcessCollector::GetImageType(DWORD processId) {
   const KernelHandle process(OpenProcess(PROCESS_QUERY_INFORMATION, FALSE, processId));
-  if (!process) return {};
+  if (!process) {
+    LOG_TRACE(L"systeminfo::ProcessCollector::GetImageType", L"process %u cannot be opened, error %u", processId,
+              GetLastError());
+    return {};
+  }
   BOOL isWow64 = FALSE;
   if (!IsWow64Process(process.Get(), &isWow64)) {
     LOG_TRACE(L"systeminfo::ProcessCollector::GetImageType", L"IsWow64Process failed with %u", GetLastError());

@@ -31,6 +31,9 @@ void ProcessInfoCache::TakeProceessesSnapshot() {
   std::sort(ids.begin(), ids.end());
   for (const DWORD id : ids) {
     KernelHandle process(OpenProcess(PROCESS_ALL_ACCESS, FALSE, id));
+    if (!process) {
+      LOG_TRACE(L"systeminfo::ProcessInfoCache", L"process %u cannot be opened, error %u", id, GetLastError());
+    }
     std::wstring path = GetProcessName(process.Get());
     m_records.push_back({std::move(process), id, std::move(path)});
   }

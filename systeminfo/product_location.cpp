@@ -24,6 +24,7 @@ std::wstring GetProductInstallLocation() {
   std::wstring location;
   if (!uninstall) {
     LOG_ERROR(kScope, L"Could not find Installed product uninstall key in registry");
+    uninstall.LogUnlessAbsent(kScope, L"the uninstall key");
     return location;
   }
   uninstall.WalkSubkeys([&](const std::wstring& name) {

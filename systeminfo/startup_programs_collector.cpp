@@ -62,7 +62,10 @@ void StartupProgramsCollector::Start(const std::shared_ptr<CollectingSettings>& 
 void StartupProgramsCollector::FromRegistry(const Json::Value& config) {
   for (const std::wstring& path : ReadList(config, "from_registry_file", kFromRegistry)) {
     const utils::RegistryKey key(path);
-    if (!key) continue;  // most machines have only some of the keys
+    if (!key) {  // most machines have only some of the keys
+      key.LogUnlessAbsent(kFromRegistry, path);
+      continue;
+    }
     for (const utils::RegistryValue& value : key.GetValues()) {
       Json::Value entry(Json::objectValue);
       entry["key"] = ToUtf8(path);

@@ -131,10 +131,13 @@ Json::Value LocaleName(const Json::Value& wmiLocale) {
   const auto result = std::from_chars(text.data(), text.data() + text.size(), identifier, 16);
   if (result.ec != std::errc()) return "";
   const int size = GetLocaleInfoW(identifier, LOCALE_SNAME, nullptr, 0);
-  if (size <= 1) return "";
   std::wstring name(static_cast<size_t>(size), L'\0');
-  const int written = GetLocaleInfoW(identifier, LOCALE_SNAME, name.data(), size);
-  if (written < 1) return "";
+  const int written = size == 0 ? 0 : GetLocaleInfoW(identifier, LOCALE_SNAME, name.data(), size);
+  if (written < 1) {
+    LOG_WARNING(L"systeminfo::SystemSummary::Start", L"the locale %x has no name, error %u", identifier,
+                GetLastError());
+    return "";
+  }
   name.resize(static_cast<size_t>(written) - 1);  // without the terminator
   return ToUtf8(name);
 }

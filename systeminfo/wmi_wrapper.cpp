@@ -69,6 +69,7 @@ bool WMIWrapper::Connect() {
     return false;
   }
   const ScopedBstr space = MakeBstr(L"ROOT\\CIMV2");
+  if (!space) return Succeeded(E_OUTOFMEMORY, L"No memory for the namespace. Error code = %x");
   if (!Succeeded(
           m_locator->ConnectServer(space.Get(), nullptr, nullptr, nullptr, 0, nullptr, nullptr, m_services.Receive()),
           L"Coult not connect to server. Error code = %x")) {
@@ -96,6 +97,10 @@ int WMIWrapper::VisitInstances(const std::wstring& query, bool onlyFirst, const 
   }
   const ScopedBstr language = MakeBstr(L"WQL");
   const ScopedBstr text = MakeBstr(query);
+  if (!language || !text) {
+    LOG_ERROR(kExecuteQuery, L"Query %s failed. Error code %x", query.c_str(), static_cast<unsigned>(E_OUTOFMEMORY));
+    return 1;
+  }
   ComPtr<IEnumWbemClassObject> instances;
   HRESULT status = m_services->ExecQuery(
       language.Get(), text.Get(), WBEM_FLAG_FORWARD_ONLY | WBEM_FLAG_RETURN_IMMEDIATELY, nullptr, instances.Receive());
@@ -140,8 +145,11 @@ int WMIWrapper::ExecuteQuery(const std::wstring& query, const Names& names, Tabl
 WMIWrapper::Names WMIWrapper::PropertiesOf(const std::wstring& className, const Names& names) {
   const ScopedBstr path = MakeBstr(className);
   ComPtr<IWbemClassObject> definition;
-  if (!m_services || FAILED(m_services->GetObject(path.Get(), 0, nullptr, definition.Receive(), nullptr)) ||
-      !definition) {
+  if (!m_services || !path) return names;
+  const HRESULT status = m_services->GetObject(path.Get(), 0, nullptr, definition.Receive(), nullptr);
+  if (FAILED(status) || !definition) {
+    LOG_WARNING(L"WMIWrapper::PropertiesOf", L"The class %s cannot be asked. Error code %x", className.c_str(),
+                static_cast<unsigned>(status));
     return names;
   }
   Names known;

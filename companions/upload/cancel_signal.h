@@ -3,13 +3,16 @@
 
 #include <windows.h>
 
+#include "core/logging.h"
 #include "core/scoped.h"
 
 namespace qxlink {
 
 class CancelSignal {
  public:
-  CancelSignal() : m_event(CreateEventW(nullptr, TRUE, FALSE, nullptr)) {}
+  CancelSignal() : m_event(CreateEventW(nullptr, TRUE, FALSE, nullptr)) {
+    if (!m_event) LOG_WARNING(L"qxlink::CancelSignal", L"nothing can be cancelled, error %u", GetLastError());
+  }
 
   void Set() { SetEvent(m_event.Get()); }
   bool IsSet() const { return Wait(0); }

@@ -17,8 +17,8 @@ constexpr DWORD kMostOfHeaders = 64 << 10;       // bytes
 constexpr DWORD kLettingGo = 1000;               // milliseconds
 constexpr DWORD kSocketTimedOut = WSAETIMEDOUT;  // what some versions of the system report instead of their own number
 
-void SetNumber(HINTERNET handle, DWORD option, DWORD value) {
-  WinHttpSetOption(handle, option, &value, sizeof value);
+bool SetNumber(HINTERNET handle, DWORD option, DWORD value) {
+  return WinHttpSetOption(handle, option, &value, sizeof value) != FALSE;
 }
 
 bool IsTlsError(DWORD error) {
@@ -85,12 +85,15 @@ DWORD HttpClient::Open() {
   if (const DWORD error = OpenSession(); error != ERROR_SUCCESS) return error;
   const auto milliseconds = [](uint64_t value) { return static_cast<int>(Limited(value)); };
   const UploadTimeouts& timeouts = m_config.timeouts;
-  WinHttpSetTimeouts(m_session.Get(), milliseconds(timeouts.connect), milliseconds(timeouts.connect),
-                     milliseconds(timeouts.send), milliseconds(timeouts.receive));
-  SetNumber(m_session.Get(), WINHTTP_OPTION_RECEIVE_RESPONSE_TIMEOUT, Limited(timeouts.receive));
+  if (!WinHttpSetTimeouts(m_session.Get(), milliseconds(timeouts.connect), milliseconds(timeouts.connect),
+                          milliseconds(timeouts.send), milliseconds(timeouts.receive)) ||
+      !SetNumber(m_session.Get(), WINHTTP_OPTION_RECEIVE_RESPONSE_TIMEOUT, Limited(timeouts.receive))) {
+    LOG_WARNING(L"qxlink::HttpClient::Open", L"the time-outs are the system's own, error %u", GetLastError());
+  }
   DWORD protocols = WINHTTP_FLAG_SECURE_PROTOCOL_TLS1_2 | WINHTTP_FLAG_SECURE_PROTOCOL_TLS1_3;
-  if (!WinHttpSetOption(m_session.Get(), WINHTTP_OPTION_SECURE_PROTOCOLS, &protocols, sizeof protocols)) {
-    SetNumber(m_session.Get(), WINHTTP_OPTION_SECURE_PROTOCOLS, WINHTTP_FLAG_SECURE_PROTOCOL_TLS1_2);
+  if (!WinHttpSetOption(m_session.Get(), WINHTTP_OPTION_SECURE_PROTOCOLS, &protocols, sizeof protocols) &&
+      !SetNumber(m_session.Get(), WINHTTP_OPTION_SECURE_PROTOCOLS, WINHTTP_FLAG_SECURE_PROTOCOL_TLS1_2)) {
+    return GetLastError();
   }
   if (WinHttpSetStatusCallback(m_session.Get(), &HttpRequestState::OnStatus, HttpRequestState::kNotifications, 0) ==
       WINHTTP_INVALID_STATUS_CALLBACK) {
@@ -110,12 +113,17 @@ std::shared_ptr<HttpRequestState> HttpClient::OpenRequest(const HttpRequest& req
   const bool checksItself = m_server.isSecure && m_trust != nullptr;
   auto state = HttpRequestState::Make(handle, checksItself ? m_trust : nullptr, ToWide(m_server.host));
   if (!state) return nullptr;
-  SetNumber(handle, WINHTTP_OPTION_DISABLE_FEATURE, WINHTTP_DISABLE_REDIRECTS | WINHTTP_DISABLE_COOKIES);
-  // The user's own credentials are for a proxy, never for the service.
-  DWORD logon = WINHTTP_AUTOLOGON_SECURITY_LEVEL_HIGH;
-  WinHttpSetOption(handle, WINHTTP_OPTION_AUTOLOGON_POLICY, &logon, sizeof logon);
-  if (checksItself) SetNumber(handle, WINHTTP_OPTION_SECURITY_FLAGS, SECURITY_FLAG_IGNORE_UNKNOWN_CA);
-  return state;
+  // A request that cannot be restricted so is none: it could lead a package elsewhere. The user's own credentials are
+  // for a proxy, never for the service.
+  const bool isRestricted =
+      SetNumber(handle, WINHTTP_OPTION_DISABLE_FEATURE, WINHTTP_DISABLE_REDIRECTS | WINHTTP_DISABLE_COOKIES) &&
+      SetNumber(handle, WINHTTP_OPTION_AUTOLOGON_POLICY, WINHTTP_AUTOLOGON_SECURITY_LEVEL_HIGH) &&
+      (!checksItself || SetNumber(handle, WINHTTP_OPTION_SECURITY_FLAGS, SECURITY_FLAG_IGNORE_UNKNOWN_CA));
+  if (isRestricted) return state;
+  const DWORD error = GetLastError();
+  state->Close();
+  SetLastError(error);
+  return nullptr;
 }
 
 HttpOutcome HttpClient::Exchange(const HttpRequest& request, HttpReply& reply) {

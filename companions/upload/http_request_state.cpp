@@ -46,10 +46,10 @@ std::shared_ptr<HttpRequestState> HttpRequestState::Make(HINTERNET request, cons
   state->m_host = std::move(host);
   state->m_done.Reset(CreateEventW(nullptr, FALSE, FALSE, nullptr));
   state->m_closed.Reset(CreateEventW(nullptr, TRUE, FALSE, nullptr));
-  DWORD_PTR number = Requests().Add(state);
-  if (WinHttpSetOption(request, WINHTTP_OPTION_CONTEXT_VALUE, &number, sizeof number)) return state;
+  DWORD_PTR number = state->m_done && state->m_closed ? Requests().Add(state) : 0;
+  if (number != 0 && WinHttpSetOption(request, WINHTTP_OPTION_CONTEXT_VALUE, &number, sizeof number)) return state;
   const DWORD error = GetLastError();
-  Requests().Remove(number);
+  if (number != 0) Requests().Remove(number);
   WinHttpCloseHandle(std::exchange(state->m_handle, nullptr));
   SetLastError(error);
   return nullptr;

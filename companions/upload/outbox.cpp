@@ -65,7 +65,11 @@ void WriteDescription(const std::wstring& path, const UploadRequest& request, co
   Json::Value description(Json::objectValue);
   description["category"] = request.category;
   description["size"] = static_cast<Json::UInt64>(totals.size);
-  if (!totals.sha256.empty()) description["sha256"] = totals.sha256;
+  if (!totals.sha256.empty()) {
+    description["sha256"] = totals.sha256;
+  } else {
+    LOG_WARNING(kScope, L"the system cannot compute a SHA-256");
+  }
   if (!request.tags.isNull()) description["tags"] = request.tags;
   const DWORD error = WriteWholeFile(path + std::wstring(kDescriptionSuffix), WriteStyledJson(description));
   if (error != ERROR_SUCCESS) LOG_WARNING(kScope, L"the description of the file cannot be written, error %u", error);
@@ -94,10 +98,16 @@ template <class Function>
 void ForEachOutboxFile(const std::wstring& folder, Function take) {
   WIN32_FIND_DATAW data{};
   const FindHandle find(FindFirstFileW((folder + L"\\*").c_str(), &data));
-  if (!find) return;
+  if (!find) {
+    const DWORD error = GetLastError();
+    if (error != ERROR_FILE_NOT_FOUND) LOG_WARNING(kScope, L"the outbox cannot be listed, error %u", error);
+    return;
+  }
   do {
     if ((data.dwFileAttributes & FILE_ATTRIBUTE_DIRECTORY) == 0 && IsOutboxName(data.cFileName)) take(data);
   } while (FindNextFileW(find.Get(), &data));
+  const DWORD error = GetLastError();
+  if (error != ERROR_NO_MORE_FILES) LOG_WARNING(kScope, L"the outbox cannot be listed to its end, error %u", error);
 }
 
 }  // namespace

@@ -24,6 +24,10 @@ QxskylaneContext::~QxskylaneContext() {
 }
 
 int32_t QxskylaneContext::Configure(const std::wstring& libraryFolder) {
+  if (libraryFolder.empty()) {  // a configuration elsewhere would send packages elsewhere
+    LOG_ERROR(kConfigureScope, L"the library does not know its folder, where qxlink.json lies");
+    return QXSKYLANE_CONFIGURATION_INVALID;
+  }
   std::string json;
   const DWORD error = ReadWholeFile(libraryFolder + L"\\qxlink.json", kLongestConfiguration, json);
   if (error == ERROR_FILE_NOT_FOUND) {

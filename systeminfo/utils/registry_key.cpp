@@ -106,6 +106,11 @@ RegistryKey::RegistryKey(HKEY parent, std::wstring_view path, REGSAM access, DWO
   m_openError = static_cast<DWORD>(RegOpenKeyExW(parent, terminated.c_str(), options, access, m_key.Receive()));
 }
 
+void RegistryKey::LogUnlessAbsent(const wchar_t* function, std::wstring_view path) const {
+  if (m_openError == ERROR_FILE_NOT_FOUND || m_openError == ERROR_PATH_NOT_FOUND) return;
+  LOG_WARNING(function, L"The key %s cannot be opened, error %u", std::wstring(path).c_str(), m_openError);
+}
+
 std::vector<RegistryValue> RegistryKey::GetValues() const {
   std::vector<RegistryValue> values;
   if (!m_key) return values;

@@ -34,6 +34,8 @@ class RegistryKey {
   // that is an error, the caller knows.
   explicit operator bool() const { return m_openError == ERROR_SUCCESS; }
   DWORD OpenError() const { return m_openError; }
+  // For who takes an absent key for an ordinary thing: logs any other reason why this one, `path`, is not open.
+  void LogUnlessAbsent(const wchar_t* function, std::wstring_view path) const;
 
   // All values, their names in lower case, in the system's order. A failure is logged, and what was read until then is
   // returned.
