@@ -32,7 +32,7 @@ std::vector<std::wstring> FindInstallLogs(const std::wstring& temporaryFolder, c
   std::vector<std::wstring> files;
   WalkDir(temporaryFolder, [&](const qx::PathString& path, uint32_t) {
     const std::wstring_view text(path);
-    if (CompareStringOrdinal(ExtendedPath(text).c_str(), -1, ownFolder.c_str(), -1, TRUE) == CSTR_EQUAL) {
+    if (EqualNames(ExtendedPath(text), ownFolder)) {
       return kWalkSkip;
     }
     if (text.find(L"qxinst.") != std::wstring_view::npos) files.emplace_back(text);

@@ -2,6 +2,8 @@
 
 #include <windows.h>
 
+#include "core/paths.h"
+
 namespace {
 
 std::wstring ModulePath(HMODULE module) {
@@ -11,11 +13,6 @@ std::wstring ModulePath(HMODULE module) {
   return path;
 }
 
-std::wstring FolderOf(const std::wstring& path) {
-  const size_t separator = path.find_last_of(L"\\/");
-  return separator == std::wstring::npos ? std::wstring() : path.substr(0, separator);
-}
-
 }  // namespace
 
 std::wstring ProgramPath() {
@@ -23,12 +20,12 @@ std::wstring ProgramPath() {
 }
 
 std::wstring ProgramFolder() {
-  return FolderOf(ProgramPath());
+  return std::wstring(ParentFolder(ProgramPath()));
 }
 
 std::wstring OwnModuleFolder() {
   HMODULE module = nullptr;
   GetModuleHandleExW(GET_MODULE_HANDLE_EX_FLAG_FROM_ADDRESS | GET_MODULE_HANDLE_EX_FLAG_UNCHANGED_REFCOUNT,
                      reinterpret_cast<LPCWSTR>(&OwnModuleFolder), &module);
-  return FolderOf(ModulePath(module));
+  return std::wstring(ParentFolder(ModulePath(module)));
 }
