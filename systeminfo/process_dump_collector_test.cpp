@@ -139,7 +139,7 @@ class ProcessDumpCollectorTest : public testing::Test {
 TEST_F(ProcessDumpCollectorTest, EveryProcessOfANameIsDumpedIntoTheOutputFolder) {
   const WaitingProgram first(m_programs, L"svc_one.exe"), second(m_programs, L"svc_two.exe");
   const WaitingProgram third(m_programs, L"other.exe");
-  const std::wstring name = std::wstring(LastPathComponent(m_programs.Path())) + L"_svc_";
+  const std::wstring name = std::wstring(LastPathComponent(m_programs.Path())) + L"\\svc_";
   const std::wstring names[] = {DumpFileName(name, first.Id()), DumpFileName(name, second.Id())};
   m_folder.MakeFile(L"output\\" + names[0], "an older one");
   Json::Value both = Target("name", Piece(L"svc_"));
