@@ -33,7 +33,7 @@ std::vector<std::wstring> FindInstallLogs(const std::wstring& temporaryFolder, c
   std::vector<std::wstring> files;
   WalkDir(temporaryFolder, [&](const qx::PathString& path, const WIN32_FIND_DATAW& entry) {
     const std::wstring_view text(path);
-    if (CompareStringOrdinal(ExtendedPath(text).c_str(), -1, ownFolder.c_str(), -1, TRUE) == CSTR_EQUAL) {
+    if (EqualNames(ExtendedPath(text), ownFolder)) {
       return kWalkSkip;
     }
     if (!IsLink(entry) && text.find(L"qxinst.") != std::wstring_view::npos) files.emplace_back(text);

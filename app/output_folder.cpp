@@ -18,11 +18,6 @@ constexpr wchar_t kScope[] = L"st::OutputFolder";
 constexpr std::wstring_view kLocalPrefix = L"\\\\?\\";
 constexpr std::wstring_view kNetworkPrefix = L"\\\\?\\UNC\\";
 
-bool EqualIgnoringCase(std::wstring_view a, std::wstring_view b) {
-  return a.size() == b.size() && CompareStringOrdinal(a.data(), static_cast<int>(a.size()), b.data(),
-                                                      static_cast<int>(b.size()), TRUE) == CSTR_EQUAL;
-}
-
 struct FolderPlace {
   std::wstring_view path;  // behind the prefix
   size_t rootParts;        // parts of the path that name its root; 0 when it is neither on a drive nor on a share
@@ -34,7 +29,7 @@ FolderPlace PlaceOf(std::wstring_view folder) {
   folder.remove_prefix(kLocalPrefix.size());
   constexpr std::wstring_view kVolume = L"Volume{";
   const bool isDrive = folder.size() >= 2 && folder[1] == L':' && (folder.size() == 2 || folder[2] == L'\\');
-  return {folder, isDrive || EqualIgnoringCase(folder.substr(0, kVolume.size()), kVolume) ? size_t{1} : size_t{0}};
+  return {folder, isDrive || EqualNames(folder.substr(0, kVolume.size()), kVolume) ? size_t{1} : size_t{0}};
 }
 
 struct KnownFolder {

@@ -14,6 +14,12 @@ else()
   # _FORTIFY_SOURCE needs an optimised build; the assertions of the C++ library stay on in every build.
   target_compile_definitions(st_options INTERFACE
     _GLIBCXX_ASSERTIONS $<$<NOT:$<CONFIG:Debug>>:_FORTIFY_SOURCE=2>)
+  # In what ships too: tests and benchmarks run what ships. The processor has no alignment faults, and records of files
+  # are read in place.
+  if(ST_UNDEFINED_TRAPS)
+    target_compile_options(st_options INTERFACE
+      -fsanitize=undefined -fno-sanitize=alignment -fsanitize-undefined-trap-on-error)
+  endif()
   # -static: no run-time library of the compiler has to lie beside the program.
   target_link_options(st_options INTERFACE -static -fstack-protector-strong
     -Wl,--dynamicbase -Wl,--high-entropy-va -Wl,--nxcompat)

@@ -5,6 +5,7 @@
 #include "core/files.h"
 #include "core/log_folder.h"
 #include "core/logging.h"
+#include "core/paths.h"
 #include "core/program_path.h"
 #include "core/text.h"
 
@@ -34,7 +35,7 @@ bool ReadFolder(const std::wstring& path, std::wstring& folder) {
                 document.Error() ? document.ErrorStr() : "no element \"configuration\"");
     return false;
   }
-  const std::wstring settingsFolder = path.substr(0, path.find_last_of(L"\\/"));
+  const std::wstring settingsFolder(ParentFolder(path));
   folder = ResolveLogFolder(ExpandEnvironment(ToWide(ConfiguredLogFolder(*configuration))), settingsFolder);
   return true;
 }

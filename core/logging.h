@@ -154,7 +154,7 @@ void Write(int16_t step, Level level, const wchar_t* function, const wchar_t* fo
                 "a log argument is a number or a pointer; pass text as .c_str()");
   const Route route(level);
   if (const auto write = route.LibraryWrite()) {
-    const LogRecord record{static_cast<uint32_t>(level)};
+    const LogRecord record = {static_cast<uint32_t>(level)};
     write(step, &record, GetModuleHandleW(nullptr), function, format, Promoted(arguments)...);
   }
   if (route.Captures()) route.Capture(function, format, Promoted(arguments)...);

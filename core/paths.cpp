@@ -20,6 +20,11 @@ std::wstring_view LastPathComponent(std::wstring_view path) {
   return path.substr(path.find_last_of(kSeparators) + 1);
 }
 
+std::wstring_view ParentFolder(std::wstring_view path) {
+  const size_t separator = path.find_last_of(kSeparators);
+  return separator == std::wstring_view::npos ? std::wstring_view() : path.substr(0, separator);
+}
+
 bool IsAbsolutePath(std::wstring_view path) {
   const auto isSeparator = [](wchar_t c) { return c == L'\\' || c == L'/'; };
   if (path.size() >= 2 && isSeparator(path[0]) && isSeparator(path[1])) return true;
@@ -40,10 +45,14 @@ bool IsVolumeRoot(std::wstring_view extendedPath) {
   return separators <= (isNetwork ? 1 : 0);  // "server\share", "C:"
 }
 
+bool EqualNames(std::wstring_view a, std::wstring_view b) {
+  return CompareStringOrdinal(a.data(), static_cast<int>(a.size()), b.data(), static_cast<int>(b.size()), TRUE) ==
+         CSTR_EQUAL;
+}
+
 bool FolderContains(std::wstring_view outer, std::wstring_view inner) {
   outer = WithoutEndSeparators(outer);
   inner = WithoutEndSeparators(inner);
   if (inner.size() < outer.size() || (inner.size() > outer.size() && inner[outer.size()] != L'\\')) return false;
-  const int length = static_cast<int>(outer.size());
-  return CompareStringOrdinal(outer.data(), length, inner.data(), length, TRUE) == CSTR_EQUAL;
+  return EqualNames(outer, inner.substr(0, outer.size()));
 }

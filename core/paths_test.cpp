@@ -27,21 +27,30 @@ TEST(JoinPath, PutsExactlyOneSeparatorBetween) {
   }
 }
 
-TEST(LastPathComponent, IsTheTextBehindTheLastSeparator) {
+TEST(PathParts, LieOnBothSidesOfTheLastSeparator) {
   struct {
     const wchar_t* path;
-    const wchar_t* expected;
+    const wchar_t* parent;
+    const wchar_t* last;  // separators at the end do not count
   } const rows[] = {
-      {L"C:\\a\\b.txt", L"b.txt"},
-      {L"C:/a/b", L"b"},
-      {L"b", L"b"},
-      {L"C:\\a\\b\\/", L"b"},
-      {L"C:\\", L"C:"},
-      {L"\\", L""},
-      {L"", L""},
+      {L"C:\\a\\b.txt", L"C:\\a", L"b.txt"},
+      {L"C:/a/b", L"C:/a", L"b"},
+      {L"b", L"", L"b"},
+      {L"C:\\a\\b\\/", L"C:\\a\\b\\", L"b"},
+      {L"C:\\", L"C:", L"C:"},
+      {L"\\", L"", L""},
+      {L"", L"", L""},
   };
-  for (const auto& row : rows)
-    EXPECT_EQ(LastPathComponent(row.path), row.expected) << row.path;
+  for (const auto& row : rows) {
+    EXPECT_EQ(ParentFolder(row.path), row.parent) << row.path;
+    EXPECT_EQ(LastPathComponent(row.path), row.last) << row.path;
+  }
+}
+
+TEST(EqualNames, IgnoresTheCaseOfAllLetters) {
+  EXPECT_TRUE(EqualNames(L"\u00c4b.TXT", L"\u00e4B.txt"));
+  EXPECT_FALSE(EqualNames(L"a", L"ab"));
+  EXPECT_FALSE(EqualNames(L"a", L"\u00e4"));
 }
 
 TEST(IsAbsolutePath, NeedsADriveWithItsRootOrAServer) {

@@ -3,6 +3,7 @@
 #include <windows.h>
 
 #include "core/logging.h"
+#include "core/paths.h"
 
 namespace {
 
@@ -16,11 +17,6 @@ std::wstring ModulePath(HMODULE module) {
   return path;
 }
 
-std::wstring FolderOf(const std::wstring& path) {
-  const size_t separator = path.find_last_of(L"\\/");
-  return separator == std::wstring::npos ? std::wstring() : path.substr(0, separator);
-}
-
 }  // namespace
 
 std::wstring ProgramPath() {
@@ -28,7 +24,7 @@ std::wstring ProgramPath() {
 }
 
 std::wstring ProgramFolder() {
-  return FolderOf(ProgramPath());
+  return std::wstring(ParentFolder(ProgramPath()));
 }
 
 std::wstring OwnModuleFolder() {
@@ -38,5 +34,5 @@ std::wstring OwnModuleFolder() {
     LOG_ERROR(kScope, L"the own module is not known, error %u", GetLastError());
     return {};  // without a module the program's own path would be asked for
   }
-  return FolderOf(ModulePath(module));
+  return std::wstring(ParentFolder(ModulePath(module)));
 }

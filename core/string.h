@@ -43,7 +43,8 @@ class StringT {
   StringT(StringT&& other) noexcept : m_buffer(std::exchange(other.m_buffer, nullptr)) {}
   StringT& operator=(const StringT& other) { return this == &other ? *this : assign(other); }
   StringT& operator=(StringT&& other) noexcept {
-    StringT(std::move(other)).swap(*this);
+    StringT moved(std::move(other));
+    swap(moved);
     return *this;
   }
   StringT& operator=(View text) { return assign(text); }

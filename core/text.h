@@ -18,3 +18,10 @@ inline std::string_view Trimmed(std::string_view text) {
 inline std::string_view Trimmed(const char* text) {
   return text == nullptr ? std::string_view() : Trimmed(std::string_view(text));
 }
+// Also without no-break spaces, which are easily copied along from a page.
+inline std::wstring_view Trimmed(std::wstring_view text) {
+  constexpr std::wstring_view kBlanks = L" \t\r\n\u00A0";
+  const size_t first = text.find_first_not_of(kBlanks);
+  if (first == std::wstring_view::npos) return {};
+  return text.substr(first, text.find_last_not_of(kBlanks) - first + 1);
+}

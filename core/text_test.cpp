@@ -32,4 +32,6 @@ TEST(Text, TrimmedTextHasNoBlanksAtItsEnds) {
   EXPECT_EQ(Trimmed("a"), "a");
   for (const char* blank : {"", " ", "\r\n", static_cast<const char*>(nullptr)})
     EXPECT_EQ(Trimmed(blank), "");
+  EXPECT_EQ(Trimmed(L" \t a b\u00A0\r\n"), L"a b");
+  EXPECT_EQ(Trimmed(L" \n"), L"");
 }

@@ -110,11 +110,6 @@ TEST(EmailAddress, IsWhatTheExpressionMatchesAsAWhole) {
   EXPECT_FALSE(qx::IsEmailAddress(std::wstring(5'000'000, L'a') + L"@"));
 }
 
-TEST(UserDetails, BlanksAroundATextAreLeftOut) {
-  EXPECT_EQ(qx::Trimmed(L" \t a b\u00A0\r\n"), L"a b");
-  EXPECT_EQ(qx::Trimmed(L" \n"), L"");
-}
-
 TEST(Language, PageIsTheOneOfTheExactNameOrTheEnglishOne) {
   EXPECT_EQ(qx::PageForLanguage(L"english"), L"support_tool_en");
   EXPECT_EQ(qx::PageForLanguage(L"romana"), L"support_tool_ro");

@@ -20,7 +20,7 @@ std::wstring LogText(const qx::Value& value) {
   constexpr size_t kLongest = 8192;
   if (!logging::IsEnabled()) return {};
   std::wstring text = value.ToText();
-  if (text.size() > kLongest) text = text.substr(0, kLongest) + L"...";
+  if (text.size() > kLongest) text.replace(kLongest, std::wstring::npos, L"...");
   return text;
 }
 

@@ -9,6 +9,7 @@
 #include "core/paths.h"
 #include "core/scope_exit.h"
 #include "core/scope_trace.h"
+#include "core/text.h"
 #include "gui/tis_wnd.h"
 #include "gui/user_details.h"
 
@@ -60,8 +61,8 @@ void TisWnd::TisValidateUserDetails(qx::Value& message) {
   SetSuccess(message, false);
   try {
     const qx::Value& request = message.Member(qx::kRequest);
-    const std::wstring_view name = qx::Trimmed(request.Member(L"user_name").AsString());
-    const std::wstring_view email = qx::Trimmed(request.Member(L"user_email").AsString());
+    const std::wstring_view name = Trimmed(request.Member(L"user_name").AsString());
+    const std::wstring_view email = Trimmed(request.Member(L"user_email").AsString());
     const bool agreed = AsBool(request.Member(L"agreed_licence"));
     const bool isReachable = qx::IsEmailAddress(email);
     if (name.empty() || !isReachable || !agreed) {

@@ -40,11 +40,4 @@ bool IsEmailAddress(std::wstring_view text) {
          std::all_of(last.begin(), last.end(), IsLetter);
 }
 
-std::wstring_view Trimmed(std::wstring_view text) {
-  constexpr wchar_t kBlanks[] = L" \t\r\n\u00A0";
-  const size_t first = text.find_first_not_of(kBlanks);
-  if (first == std::wstring_view::npos) return {};
-  return text.substr(first, text.find_last_not_of(kBlanks) - first + 1);
-}
-
 }  // namespace qx

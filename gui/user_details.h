@@ -10,7 +10,4 @@ namespace qx {
 // once for every character, and a page may send any number of them.
 bool IsEmailAddress(std::wstring_view text);
 
-// Without the blanks around it, which are easily copied along.
-std::wstring_view Trimmed(std::wstring_view text);
-
 }  // namespace qx

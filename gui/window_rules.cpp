@@ -1,16 +1,12 @@
 #include "gui/window_rules.h"
 
+#include "core/paths.h"
 #include "interfaces/html_engine.h"
 
 namespace qx::gui {
 namespace {
 
 constexpr size_t kLongestName = 260;
-
-bool SameWithoutCase(std::wstring_view left, std::wstring_view right) {
-  return CompareStringOrdinal(left.data(), static_cast<int>(left.size()), right.data(), static_cast<int>(right.size()),
-                              TRUE) == CSTR_EQUAL;
-}
 
 }  // namespace
 
@@ -31,7 +27,7 @@ std::optional<ResourceAddress> ParseResourceAddress(std::wstring_view address) {
   const std::wstring_view name = address.substr(0, kLongestName);
   const size_t point = name.rfind(L'.');
   const std::wstring_view extension = point == std::wstring_view::npos ? std::wstring_view() : name.substr(point + 1);
-  const bool isHtml = !extension.empty() && (SameWithoutCase(extension, L"html") || SameWithoutCase(extension, L"htm"));
+  const bool isHtml = !extension.empty() && (EqualNames(extension, L"html") || EqualNames(extension, L"htm"));
   return ResourceAddress{std::wstring(name), std::wstring(extension), isHtml};
 }
 

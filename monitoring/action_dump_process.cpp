@@ -8,7 +8,6 @@
 #include "core/paths.h"
 #include "core/scope_exit.h"
 #include "monitoring/dump_rules.h"
-#include "monitoring/safe_file_name.h"
 #include "systeminfo/utils/mini_dump.h"
 
 namespace st::monitoring {
@@ -90,7 +89,7 @@ void ActionDumpProcess::DumpByName(const std::wstring& name) {
 
 void ActionDumpProcess::DumpProcess(HANDLE process, DWORD processId, const std::wstring& name) {
   LOG_TRACE(kDump, L"dumping process with pid %u", processId);
-  const std::wstring path = SafeFileName(name, L"_" + std::to_wstring(processId) + L".dmp");
+  const std::wstring path = ::utils::DumpFileName(name, processId);
   LOG_TRACE(kDump, L"dump name %s", path.c_str());
   if (HasEnded(process)) {
     LOG_ERROR(kDump, L"process %u has ended before its dump", processId);

@@ -20,8 +20,8 @@ class ActionDumpProcess : public Action {
   void Run() override;
 
   // Writes "<name>_<pid>.dmp" into the current directory, replacing an older one; characters of the name that a file
-  // name cannot hold are replaced (SafeFileName). The file stands under its name only when it is whole and the limits
-  // allow it.
+  // name cannot hold are replaced (utils::DumpFileName). The file stands under its name only when it is whole and the
+  // limits allow it.
   void DumpProcess(HANDLE process, DWORD processId, const std::wstring& name);
 
  private:

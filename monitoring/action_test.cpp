@@ -8,7 +8,7 @@
 #include "core/text.h"
 #include "monitoring/action_dump_process.h"
 #include "monitoring/dump_rules.h"
-#include "monitoring/safe_file_name.h"
+#include "systeminfo/utils/mini_dump.h"
 #include "tests/support/child_process.h"
 #include "tests/support/log_text.h"
 #include "tests/support/test_folder.h"
@@ -62,10 +62,6 @@ class DumpActionTest : public testing::Test {
     return names;
   }
 
-  static std::wstring DumpName(const std::wstring& name, DWORD pid) {
-    return SafeFileName(name, L"_" + std::to_wstring(pid) + L".dmp");
-  }
-
   const TestFolder m_folder;
   const CurrentFolder m_in;
   Limits m_limits;
@@ -78,7 +74,7 @@ TEST_F(DumpActionTest, AProcessGivenByItsIdIsDumpedUnderItsFileName) {
   const ChildProcess child = StartChild(L"busy \u6771");
   logging::ErrorCapture lines(logging::Level::kTrace);
   RunByPid(child.Id());
-  const std::wstring name = DumpName(L"busy \u6771.exe", child.Id());
+  const std::wstring name = ::utils::DumpFileName(L"busy \u6771.exe", child.Id());
   EXPECT_THAT(Dumps(), ElementsAre(name));
   const std::string dump = LogText(m_folder.Path(name));
   EXPECT_TRUE(IsWholeDump(dump.substr(0, kDumpBeginning), dump.size()));
@@ -91,17 +87,17 @@ TEST_F(DumpActionTest, AProcessGivenByItsIdIsDumpedUnderItsFileName) {
 TEST_F(DumpActionTest, EveryProcessWhosePathHasTheNameIsDumpedAndAnOlderDumpIsReplaced) {
   const ChildProcess one = StartChild(L"twin");
   const ChildProcess two = StartChild(L"twin");
-  const std::wstring first = DumpName(L"twin", one.Id());
+  const std::wstring first = ::utils::DumpFileName(L"twin", one.Id());
   m_folder.MakeFile(first, "older");
   RunByName(L"twin");
-  EXPECT_THAT(Dumps(), testing::UnorderedElementsAre(first, DumpName(L"twin", two.Id())));
+  EXPECT_THAT(Dumps(), testing::UnorderedElementsAre(first, ::utils::DumpFileName(L"twin", two.Id())));
   EXPECT_GT(LogText(m_folder.Path(first)).size(), 1000U);
 }
 
 TEST_F(DumpActionTest, ANameThatNoFileCanHaveIsReplacedNotRefused) {
   const ChildProcess child = StartChild(L"target");
   RunByName(L"\\target.exe");
-  EXPECT_THAT(Dumps(), ElementsAre(DumpName(L"\\target.exe", child.Id())));
+  EXPECT_THAT(Dumps(), ElementsAre(::utils::DumpFileName(L"\\target.exe", child.Id())));
 }
 
 TEST_F(DumpActionTest, WhoIsNotThereIsLogged) {
@@ -163,7 +159,8 @@ TEST_F(DumpActionTest, AFullDiskLeavesNoFileHoweverTheWriterTellsOfIt) {
 }
 
 TEST_F(DumpActionTest, AFileThatCannotBeMadeIsLoggedWithTheReason) {
-  const std::wstring name = DumpName(std::wstring(LastPathComponent(ProgramPath())), GetCurrentProcessId());
+  const std::wstring name =
+      ::utils::DumpFileName(std::wstring(LastPathComponent(ProgramPath())), GetCurrentProcessId());
   m_folder.MakeFolder(name + L".partial");
   logging::ErrorCapture errors;
   RunByPid(GetCurrentProcessId());

@@ -6,9 +6,9 @@
 #include "core/logging.h"
 #include "core/paths.h"
 #include "core/program_path.h"
+#include "core/safe_file_name.h"
 #include "core/scope_exit.h"
 #include "monitoring/action_dump_process.h"
-#include "monitoring/safe_file_name.h"
 #include "monitoring/trigger_rules.h"
 
 namespace st::monitoring {
@@ -18,11 +18,6 @@ constexpr wchar_t kSubscriber[] = L"st_monitoring";
 constexpr wchar_t kInit[] = L"st::monitoring::MonitoringManager::Init";
 constexpr wchar_t kStart[] = L"st::monitoring::MonitoringManager::Start";
 constexpr wchar_t kTick[] = L"st::monitoring::MonitoringManager::Tick";
-
-std::wstring FolderOf(const std::wstring& path) {
-  const size_t separator = path.find_last_of(L"\\/");
-  return separator == std::wstring::npos ? std::wstring() : path.substr(0, separator + 1);
-}
 
 }  // namespace
 
@@ -138,10 +133,11 @@ bool MonitoringManager::IsValidConfiguration() const {
 }
 
 void MonitoringManager::MakeSampleFiles(uint64_t mostBytes) {
-  const std::wstring folder = FolderOf(m_configurationPath);
+  const std::wstring_view folder = ParentFolder(m_configurationPath);
   for (const auto& [id, counter] : m_counters) {
     if (!counter->SavesToFile()) continue;
-    m_sampleFiles.emplace(id, std::make_unique<SampleFile>(folder + SafeFileName(id, L".csv"), mostBytes));
+    m_sampleFiles.emplace(
+        id, std::make_unique<SampleFile>(std::wstring(JoinPath(folder, SafeFileName(id, L".csv"))), mostBytes));
   }
 }
 

@@ -26,7 +26,8 @@ Bytes Text(size_t size) {
   std::string text;
   while (text.size() < size)
     text += "line " + std::to_string(random() % 5000) + (random() % 3 ? " done\r\n" : " fails\r\n");
-  return Bytes(text.begin(), text.begin() + static_cast<std::ptrdiff_t>(size));
+  text.resize(size);
+  return Bytes(text.begin(), text.end());
 }
 
 // Long stretches of one kind, so that one stream has blocks of every type.

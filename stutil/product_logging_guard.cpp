@@ -20,6 +20,7 @@ ProductLoggingGuard::ProductLoggingGuard(std::function<void()> restore)
       m_done(CreateEventW(nullptr, FALSE, FALSE, nullptr)),
       m_thread(&ProductLoggingGuard::Run, this) {
   g_guard = this;
+  // cppcheck-suppress useInitializationList ; nobody may be called before g_guard says whom
   m_previous = SetUnhandledExceptionFilter(&OnUnhandled);
 }
 

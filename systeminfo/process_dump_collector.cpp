@@ -98,7 +98,7 @@ void ProcessDumpCollector::DumpProcess(const std::wstring& name, HANDLE process,
     LOG_ERROR(kDumpProcess, L"the process %u could not be opened for a dump", processId);
     return;
   }
-  const std::wstring fileName = DumpFileName(name, processId);
+  const std::wstring fileName = ::utils::DumpFileName(name, processId);
   LOG_TRACE(kDumpProcess, L"dump name %s", fileName.c_str());
   const std::wstring path(JoinPath(m_folder, fileName));
   if (!WritePartialDump(process, processId, path)) return;
@@ -111,14 +111,6 @@ std::optional<uint32_t> DumpTargetId(const Json::Value& value) {
   constexpr double kOneTooMany = 4294967296.0;
   if (!(number > -1 && number < kOneTooMany)) return std::nullopt;
   return static_cast<uint32_t>(number);
-}
-
-std::wstring DumpFileName(std::wstring_view name, uint32_t processId) {
-  std::wstring safe(name);
-  for (wchar_t& c : safe) {
-    if (c < L' ' || std::wstring_view(L"\\/:*?\"<>|").find(c) != std::wstring_view::npos) c = L'_';
-  }
-  return Format(L"%s_%u.dmp", safe.c_str(), processId);
 }
 
 BOOL CALLBACK MyMiniDumpCallback(void*, PMINIDUMP_CALLBACK_INPUT input, PMINIDUMP_CALLBACK_OUTPUT output) {

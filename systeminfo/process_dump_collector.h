@@ -40,9 +40,6 @@ class ProcessDumpCollector : public ICollector {
 // A number, or a boolean as 0 or 1, that is an id; the fraction of a number does not count. Empty for anything else.
 std::optional<uint32_t> DumpTargetId(const Json::Value& value);
 
-// "<name>_<id>.dmp". What no file name can hold becomes "_": a process may be named by a part of its path.
-std::wstring DumpFileName(std::wstring_view name, uint32_t processId);
-
 // For MiniDumpWriteDump; see utils::FilterMiniDump.
 BOOL CALLBACK MyMiniDumpCallback(void* param, PMINIDUMP_CALLBACK_INPUT input, PMINIDUMP_CALLBACK_OUTPUT output);
 

@@ -16,6 +16,7 @@
 #include "core/program_path.h"
 #include "core/text.h"
 #include "systeminfo/collecting_settings.h"
+#include "systeminfo/utils/mini_dump.h"
 #include "tests/support/child_process.h"
 #include "tests/support/dump_streams.h"
 #include "tests/support/log_text.h"
@@ -30,14 +31,9 @@ using testing::HasSubstr;
 using testing::IsEmpty;
 using testing::Not;
 using testing::UnorderedElementsAre;
+using utils::DumpFileName;
 
 constexpr wchar_t kStart[] = L"systeminfo::ProcessDumpCollector::Start: ";
-
-TEST(DumpFileName, HoldsOnlyWhatAFileNameCan) {
-  EXPECT_EQ(DumpFileName(L"svc.exe", 4294967295u), L"svc.exe_4294967295.dmp");
-  EXPECT_EQ(DumpFileName(L"", 1), L"_1.dmp");
-  EXPECT_EQ(DumpFileName(L"..\\a/b:c*d?e\"f<g>h|i\t.\x6771", 7), L".._a_b_c_d_e_f_g_h_i_.\x6771_7.dmp");
-}
 
 TEST(DumpTargetId, OnlyNumbersAndBooleansThatAreIdsCount) {
   const struct {
@@ -143,7 +139,7 @@ class ProcessDumpCollectorTest : public testing::Test {
 TEST_F(ProcessDumpCollectorTest, EveryProcessOfANameIsDumpedIntoTheOutputFolder) {
   const WaitingProgram first(m_programs, L"svc_one.exe"), second(m_programs, L"svc_two.exe");
   const WaitingProgram third(m_programs, L"other.exe");
-  const std::wstring name = std::wstring(LastPathComponent(m_programs.Path())) + L"_svc_";
+  const std::wstring name = std::wstring(LastPathComponent(m_programs.Path())) + L"\\svc_";
   const std::wstring names[] = {DumpFileName(name, first.Id()), DumpFileName(name, second.Id())};
   m_folder.MakeFile(L"output\\" + names[0], "an older one");
   Json::Value both = Target("name", Piece(L"svc_"));

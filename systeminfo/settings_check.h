@@ -20,7 +20,7 @@ struct UnknownKey {
 // itself, in the order of their keys.
 std::vector<UnknownKey> FindUnknownKeys(const Json::Value& document, std::span<const std::string> collectorKeys);
 
-// The candidate that differs from `key` by at most two inserted, dropped or changed characters, whatever their case;
+// The candidate that differs from `key` by at most two edits (EditDistance);
 // the first of the nearest ones, or empty.
 std::string NearestKey(std::string_view key, std::span<const std::string> candidates);
 

@@ -34,6 +34,7 @@ TEST(NearestKey, TwoEditsAreNearAndThreeAreNot) {
   } const rows[] = {
       {"storag", "storage"},
       {"stoarge", "storage"},
+      {"stoareg", "storage"},
       {"stor", ""},
       {"storagexx", "storage"},
       {"storagexxx", ""},

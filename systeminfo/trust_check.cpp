@@ -66,6 +66,7 @@ CertVerifier::CertVerifier(const TrustCalls& calls, std::unique_ptr<CatalogHashI
 bool CertVerifier::IsReady() {
   if (m_state == State::kNew) {
     const std::lock_guard lock(m_initialization);
+    // cppcheck-suppress identicalInnerCondition ; another thread may have been here before this one had the lock
     if (m_state == State::kNew) {
       const bool isBound = BindLibraries();
       if (isBound) m_index = LoadCatalogHashIndex();

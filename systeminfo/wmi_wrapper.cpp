@@ -132,13 +132,14 @@ int WMIWrapper::ExecuteQuery(const std::wstring& query, const Names& names, Rows
 
 int WMIWrapper::ExecuteQuery(const std::wstring& query, const Names& names, Table& table) {
   return VisitInstances(query, false, [&](IWbemClassObject& instance) {
-    std::vector<Json::Value>& row = table.emplace_back();
+    std::vector<Json::Value> row;
     ReadProperties(
         instance, names, [&row](const std::wstring&, Json::Value value) { row.push_back(std::move(value)); },
         [](const std::wstring& name, HRESULT status) {
           LOG_ERROR(kExecuteQuery, L"IWbemClassObject->Get(%s) failed with message %s", name.c_str(),
                     WbemErrorName(status));
         });
+    table.push_back(std::move(row));
   });
 }
 

@@ -74,8 +74,8 @@ void CrashHandler::ReserveStack() {
 LONG WINAPI CrashHandler::OnUnhandled(EXCEPTION_POINTERS* exception) {
   if (IsGccThrow(*exception->ExceptionRecord)) return EXCEPTION_CONTINUE_EXECUTION;
   CrashHandler* const handler = g_installed.load();
-  if (handler == nullptr) return EXCEPTION_CONTINUE_SEARCH;
-  handler->EndProcess(exception);
+  if (handler != nullptr) handler->EndProcess(exception);
+  return EXCEPTION_CONTINUE_SEARCH;
 }
 
 // The system does not show a corrupt heap to the filter of unhandled exceptions.

@@ -65,7 +65,7 @@ RVA PlainDump::AddString(std::span<const wchar_t> text) noexcept {
   if (bytes == nullptr) return 0;
   const auto length = static_cast<ULONG32>(text.size_bytes());
   std::memcpy(bytes, &length, sizeof length);
-  std::memcpy(bytes + sizeof length, text.data(), length);
+  if (length != 0) std::memcpy(bytes + sizeof length, text.data(), length);  // an empty text may have no place
   return OffsetOf(bytes);
 }
 

@@ -2,14 +2,10 @@
 
 #include <algorithm>
 
+#include "core/ascii.h"
+
 namespace engine {
 namespace {
-
-bool StartsWithIgnoringCase(std::string_view text, std::string_view lowerCase) {
-  return text.size() >= lowerCase.size() &&
-         std::equal(lowerCase.begin(), lowerCase.end(), text.begin(),
-                    [](char a, char b) { return a == (b >= 'A' && b <= 'Z' ? b - 'A' + 'a' : b); });
-}
 
 // The first place behind `at` that is neither space nor a comment.
 size_t SkipSpaceAndComments(std::string_view html, size_t at) {

@@ -52,7 +52,7 @@ class PipeTransport : public Transport {
   KernelHandle m_fromBrowser;
   KernelHandle m_toBrowser;
   MessageSplitter m_splitter;
-  char m_buffer[size_t{64} << 10];
+  char m_buffer[size_t{64} << 10] = {};
 };
 
 }  // namespace

@@ -3,6 +3,7 @@
 #include <algorithm>
 #include <charconv>
 
+#include "core/ascii.h"
 #include "core/text.h"
 
 namespace engine {
@@ -45,19 +46,6 @@ constexpr MimeType kMimeTypes[] = {
     {L"woff2", "font/woff2"},
     {L"ttf", "font/ttf"},
 };
-
-wchar_t Lower(wchar_t c) {
-  return c >= L'A' && c <= L'Z' ? static_cast<wchar_t>(c - L'A' + L'a') : c;
-}
-
-bool SameIgnoringCase(std::wstring_view one, std::wstring_view other) {
-  return std::equal(one.begin(), one.end(), other.begin(), other.end(),
-                    [](wchar_t a, wchar_t b) { return Lower(a) == Lower(b); });
-}
-
-bool StartsWith(std::wstring_view text, std::wstring_view prefix) {
-  return text.size() >= prefix.size() && SameIgnoringCase(text.substr(0, prefix.size()), prefix);
-}
 
 bool IsPlain(char c) {
   const bool isLetter = (c >= 'a' && c <= 'z') || (c >= 'A' && c <= 'Z');
@@ -115,7 +103,7 @@ bool IsAtRoot(std::string_view browserUrl, std::string_view name) {
 std::optional<PageAddress> ToPageAddress(std::wstring_view address) {
   for (const Scheme& scheme : kSchemes) {
     const bool isPath = scheme.isFile && address.size() > 2 && (address[1] == L':' || address.starts_with(L"\\\\"));
-    if (!isPath && !StartsWith(address, scheme.engine)) continue;
+    if (!isPath && !StartsWithIgnoringCase(address, scheme.engine)) continue;
     std::wstring rest(isPath ? address : address.substr(scheme.engine.size()));
     if (!scheme.isFile && rest.starts_with(L"//")) rest.erase(0, 2);
     PageAddress page;
@@ -150,10 +138,11 @@ std::optional<std::wstring> ToEngineUri(std::string_view browserUrl) {
 }
 
 std::optional<std::wstring> PathInside(std::wstring_view uri, std::wstring_view folder) {
-  if (folder.empty() || !StartsWith(uri, kSchemes[0].engine)) return {};
+  if (folder.empty() || !StartsWithIgnoringCase(uri, kSchemes[0].engine)) return {};
   std::wstring path(uri.substr(kSchemes[0].engine.size()));
   std::replace(path.begin(), path.end(), L'/', L'\\');
-  const bool isInside = StartsWith(path, folder) && path.size() > folder.size() + 1 && path[folder.size()] == L'\\';
+  const bool isInside =
+      StartsWithIgnoringCase(path, folder) && path.size() > folder.size() + 1 && path[folder.size()] == L'\\';
   // Nothing that leads out of the folder, and no stream of a file.
   if (!isInside || HasParentStep(path) || path.find(L':', folder.size()) != std::wstring::npos) return {};
   return path;
@@ -171,7 +160,7 @@ std::string_view MimeTypeOf(std::wstring_view uri) {
   const size_t point = uri.rfind(L'.');
   const std::wstring_view extension = point == std::wstring_view::npos ? std::wstring_view() : uri.substr(point + 1);
   for (const MimeType& mime : kMimeTypes) {
-    if (SameIgnoringCase(mime.extension, extension)) return mime.type;
+    if (EqualIgnoringCase(mime.extension, extension)) return mime.type;
   }
   return "application/octet-stream";
 }

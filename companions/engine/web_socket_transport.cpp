@@ -89,7 +89,7 @@ class WebSocketTransport : public Transport {
   InternetHandle m_session;
   InternetHandle m_connection;
   InternetHandle m_socket;
-  char m_buffer[size_t{64} << 10];
+  char m_buffer[size_t{64} << 10] = {};
 };
 
 }  // namespace

@@ -52,6 +52,7 @@ void Call(WorkItem& item, EventQueueRun callback) noexcept {
 
 }  // namespace
 
+// cppcheck-suppress uninitDerivedMemberVar ; both members of the base are initialised right here
 PeriodicQueue::PeriodicQueue() : EventQueue{&OnSchedulePeriodic, &OnCancel} {}
 
 PeriodicQueue::~PeriodicQueue() {

@@ -6,6 +6,7 @@
 #include <limits>
 #include <span>
 
+#include "core/ascii.h"
 #include "core/text.h"
 
 namespace logfile {
@@ -28,21 +29,9 @@ constexpr Word kModes[] = {{"APPEND", LOG_MODE_APPEND}, {"OVERWRITE", LOG_MODE_O
 constexpr Word kSwitch[] = {{"true", 1}, {"false", 0}};
 constexpr Word kUnits[] = {{"", 0}, {"B", 0}, {"KB", 10}, {"MB", 20}, {"GB", 30}};
 
-char Upper(char c) {
-  return c >= 'a' && c <= 'z' ? static_cast<char>(c - 'a' + 'A') : c;
-}
-
-bool SameWord(std::string_view a, std::string_view b) {
-  if (a.size() != b.size()) return false;
-  for (size_t i = 0; i < a.size(); ++i) {
-    if (Upper(a[i]) != Upper(b[i])) return false;
-  }
-  return true;
-}
-
 std::optional<uint32_t> ParseWord(std::string_view text, std::span<const Word> words) {
   for (const Word& word : words) {
-    if (SameWord(Trimmed(text), word.name)) return word.value;
+    if (EqualIgnoringCase(Trimmed(text), word.name)) return word.value;
   }
   return std::nullopt;
 }

@@ -4,6 +4,7 @@
 #include <shared_mutex>
 
 #include "core/format.h"
+#include "core/paths.h"
 #include "core/program_path.h"
 #include "core/text.h"
 
@@ -13,11 +14,8 @@ namespace {
 constexpr char kOwnFunction[] = "log";
 constexpr size_t kMostModules = 1000;
 
-std::wstring_view FileNameOf(std::wstring_view path) {
-  return path.substr(path.find_last_of(L"\\/") + 1);
-}
 std::wstring_view StemOf(std::wstring_view path) {
-  const std::wstring_view name = FileNameOf(path);
+  const std::wstring_view name = LastPathComponent(path);
   return name.substr(0, name.find_last_of(L'.'));
 }
 
@@ -130,7 +128,7 @@ Logger::Module Logger::ModuleOf(HMODULE module) {
   }
   const std::wstring path = PathOfModule(module);
   if (path.empty()) return {"?", L""};
-  Module result{ToUtf8(FileNameOf(path)), path == m_program ? L"" : std::wstring(StemOf(path))};
+  Module result{ToUtf8(LastPathComponent(path)), path == m_program ? L"" : std::wstring(StemOf(path))};
   const std::lock_guard lock(m_lock);
   if (m_modules.size() < kMostModules) m_modules.emplace(module, result);
   return result;

@@ -3,6 +3,7 @@
 
 #include "companions/log/logger.h"
 #include "core/files.h"
+#include "core/paths.h"
 #include "core/text.h"
 
 namespace logfile {
@@ -18,10 +19,6 @@ std::wstring FullPath(std::wstring_view path) {
   const std::wstring full = ExtendedPath(path);
   if (full.starts_with(kNetworkPrefix)) return L"\\\\" + full.substr(kNetworkPrefix.size());
   return full.starts_with(kLocalPrefix) ? full.substr(kLocalPrefix.size()) : full;
-}
-
-std::wstring FolderOf(const std::wstring& path) {
-  return path.substr(0, path.find_last_of(L'\\'));
 }
 
 }  // namespace
@@ -110,7 +107,7 @@ DWORD Logger::ReadSettingsFile(Reading reading) {
 
 // Makes the files follow the settings. Called with m_lock held.
 void Logger::UseSettings() {
-  const std::wstring base = FolderOf(m_settingsPath.empty() ? m_program : m_settingsPath);
+  const std::wstring base(ParentFolder(m_settingsPath.empty() ? m_program : m_settingsPath));
   const std::wstring folder = logging::ResolveLogFolder(ExpandEnvironment(ToWide(m_settings.folder)), base);
   if (folder != m_folderInUse || m_settings.depth != m_depthInUse) {
     DroppedLines missing;

@@ -1,6 +1,7 @@
 #include "companions/log/settings_watcher.h"
 
 #include "core/files.h"
+#include "core/paths.h"
 
 namespace logfile {
 namespace {
@@ -22,9 +23,7 @@ HMODULE ReferenceToOwnModule() {
 }  // namespace
 
 SettingsWatcher::SettingsWatcher(const std::wstring& path, Changed changed)
-    : m_folder(path.substr(0, path.find_last_of(L'\\'))),
-      m_changed(std::move(changed)),
-      m_stop(CreateEventW(nullptr, TRUE, FALSE, nullptr)) {
+    : m_folder(ParentFolder(path)), m_changed(std::move(changed)), m_stop(CreateEventW(nullptr, TRUE, FALSE, nullptr)) {
   if (!m_stop) return;
   Arm();  // here, so that a change right after the constructor returns is noticed
   m_thread.Reset(CreateThread(nullptr, 0, &ThreadMain, this, 0, nullptr));

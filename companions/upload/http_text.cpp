@@ -5,28 +5,16 @@
 #include <charconv>
 #include <limits>
 
+#include "core/ascii.h"
+#include "core/text.h"
+
 namespace qxlink {
 namespace {
 
 constexpr size_t kLongestAddress = 2000;
 
-char Lower(char c) {
-  return c >= 'A' && c <= 'Z' ? static_cast<char>(c - 'A' + 'a') : c;
-}
-
-bool StartsWithIgnoringCase(std::string_view text, std::string_view prefix) {
-  return text.size() >= prefix.size() && EqualIgnoringCase(text.substr(0, prefix.size()), prefix);
-}
-
 bool IsPrintable(unsigned char c) {
   return c > ' ' && c < 0x7F;
-}
-
-std::string_view Trimmed(std::string_view text) {
-  constexpr std::string_view kSpace = " \t\r\n";
-  const size_t first = text.find_first_not_of(kSpace);
-  if (first == std::string_view::npos) return {};
-  return text.substr(first, text.find_last_not_of(kSpace) - first + 1);
 }
 
 // "host", "host:port", "[address]:port". False when it is none of them.
@@ -78,11 +66,6 @@ std::optional<uint64_t> ParseHttpDate(std::string_view text) {
 }
 
 }  // namespace
-
-bool EqualIgnoringCase(std::string_view a, std::string_view b) {
-  return a.size() == b.size() &&
-         std::equal(a.begin(), a.end(), b.begin(), [](char x, char y) { return Lower(x) == Lower(y); });
-}
 
 std::optional<HttpAddress> ParseHttpAddress(std::string_view text) {
   if (text.size() > kLongestAddress || !std::all_of(text.begin(), text.end(), IsPrintable)) return std::nullopt;
@@ -204,7 +187,7 @@ std::string LoggableText(std::string_view text) {
 bool IsHeaderName(std::string_view name) {
   static constexpr std::string_view kOthers = "!#$%&'*+-.^_`|~";
   return !name.empty() && std::all_of(name.begin(), name.end(), [](char c) {
-    const char lower = Lower(c);
+    const char lower = LowerAscii(c);
     return (lower >= 'a' && lower <= 'z') || (c >= '0' && c <= '9') || kOthers.find(c) != std::string_view::npos;
   });
 }

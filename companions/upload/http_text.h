@@ -57,6 +57,4 @@ std::string LoggableText(std::string_view text);
 bool IsHeaderName(std::string_view name);
 bool IsHeaderValue(std::string_view value);
 
-bool EqualIgnoringCase(std::string_view a, std::string_view b);  // of ASCII letters
-
 }  // namespace qxlink

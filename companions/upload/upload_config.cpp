@@ -4,6 +4,7 @@
 #include <functional>
 
 #include "companions/upload/http_text.h"
+#include "core/ascii.h"
 #include "core/json.h"
 
 namespace qxlink {
@@ -27,10 +28,8 @@ bool HasControlCharacter(std::string_view text) {
 // Empty when the address is fine.
 std::string AddressProblem(const std::string& name, std::string_view text, bool allowPlainHttp) {
   const auto address = ParseHttpAddress(text);
-  const auto isScheme = [text](std::string_view scheme) {
-    return EqualIgnoringCase(text.substr(0, scheme.size()), scheme);
-  };
-  if (!isScheme("https://") && !isScheme("http://")) return "\"" + name + "\" is not an https:// address";
+  if (!StartsWithIgnoringCase(text, "https://") && !StartsWithIgnoringCase(text, "http://"))
+    return "\"" + name + "\" is not an https:// address";
   if (text.find('@') != std::string_view::npos) {
     return "\"" + name + "\" holds a user name; credentials belong into \"headers\"";
   }

@@ -1,11 +1,11 @@
 #include "systeminfo/utils/mini_dump.h"
 
 #include <mutex>
-#include <string>
 
 #include "core/dynamic_library.h"
 #include "core/format.h"
 #include "core/lock.h"
+#include "core/safe_file_name.h"
 
 namespace utils {
 namespace {
@@ -34,6 +34,10 @@ void ExcludeReadOnlyRegion(VmRegionAnswer& answer) {
 }
 
 }  // namespace
+
+std::wstring DumpFileName(std::wstring_view name, uint32_t processId) {
+  return SafeFileName(name, Format(L"_%u.dmp", processId));
+}
 
 BOOL FilterMiniDump(const MiniDumpLog& log, const MINIDUMP_CALLBACK_INPUT* input, MINIDUMP_CALLBACK_OUTPUT* output) {
   if (input == nullptr || output == nullptr) return FALSE;

@@ -10,9 +10,16 @@
 
 #include <dbghelp.h>
 
+#include <cstdint>
+#include <string>
+#include <string_view>
+
 #include "core/logging.h"
 
 namespace utils {
+
+// "<name>_<id>.dmp", made fit for a file name (SafeFileName): a process may be named by a part of its path.
+std::wstring DumpFileName(std::wstring_view name, uint32_t processId);
 
 // Data segments, handles, unloaded modules, process and thread data, private read-write memory, memory and thread
 // information.

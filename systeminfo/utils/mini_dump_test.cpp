@@ -10,6 +10,13 @@ namespace {
 
 constexpr MiniDumpLog kLog = {L"test", logging::Level::kInfo};
 
+TEST(DumpFileName, IsTheNameAndTheIdWithoutWhatNoFileNameHolds) {
+  EXPECT_EQ(DumpFileName(L"svc.exe", 4294967295U), L"svc.exe_4294967295.dmp");
+  EXPECT_EQ(DumpFileName(L"", 1), L"_1.dmp");
+  EXPECT_THAT(DumpFileName(L"..\\svc", 7),
+              testing::AllOf(testing::StartsWith(L".._svc-"), testing::EndsWith(L"_7.dmp")));
+}
+
 TEST(MiniDumpFilter, AModuleLosesItsDataSectionsElseItsCodeSections) {
   struct {
     ULONG before, after;

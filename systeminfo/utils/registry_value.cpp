@@ -2,6 +2,8 @@
 
 #include <algorithm>
 
+#include "core/ascii.h"
+
 namespace utils {
 namespace {
 
@@ -76,9 +78,7 @@ std::wstring StoredText(std::string_view data) {
 
 std::wstring LowerCase(std::wstring_view text) {
   std::wstring lower(text);
-  for (wchar_t& c : lower) {
-    if (c >= L'A' && c <= L'Z') c = static_cast<wchar_t>(c - L'A' + L'a');
-  }
+  std::transform(lower.begin(), lower.end(), lower.begin(), &LowerAscii<wchar_t>);
   return lower;
 }
 

@@ -3,7 +3,7 @@
 
 #include "monitoring/configuration.h"
 #include "monitoring/dump_rules.h"
-#include "monitoring/safe_file_name.h"
+#include "core/safe_file_name.h"
 #include "tests/fuzz/fuzz.h"
 
 namespace {

@@ -1,9 +1,10 @@
-#include "monitoring/safe_file_name.h"
+#include "core/safe_file_name.h"
 
 #include <algorithm>
 #include <cstdint>
 
-namespace st::monitoring {
+#include "core/ascii.h"
+
 namespace {
 
 bool IsForbidden(wchar_t c) {
@@ -14,12 +15,11 @@ bool IsForbidden(wchar_t c) {
 bool IsDeviceName(std::wstring_view name) {
   std::wstring stem(name.substr(0, name.find(L'.')));
   stem.erase(stem.find_last_not_of(L' ') + 1);
-  std::transform(stem.begin(), stem.end(), stem.begin(),
-                 [](wchar_t c) { return c >= L'a' && c <= L'z' ? static_cast<wchar_t>(c - L'a' + L'A') : c; });
-  constexpr std::wstring_view kDevices[] = {L"CON", L"PRN", L"AUX", L"NUL", L"CONIN$", L"CONOUT$"};
+  std::transform(stem.begin(), stem.end(), stem.begin(), &LowerAscii<wchar_t>);
+  constexpr std::wstring_view kDevices[] = {L"con", L"prn", L"aux", L"nul", L"conin$", L"conout$"};
   if (std::find(std::begin(kDevices), std::end(kDevices), stem) != std::end(kDevices)) return true;
   constexpr std::wstring_view kDigits = L"0123456789\u00B9\u00B2\u00B3";
-  return stem.size() == 4 && (stem.starts_with(L"COM") || stem.starts_with(L"LPT")) &&
+  return stem.size() == 4 && (stem.starts_with(L"com") || stem.starts_with(L"lpt")) &&
          kDigits.find(stem.back()) != std::wstring_view::npos;
 }
 
@@ -48,5 +48,3 @@ std::wstring SafeFileName(std::wstring_view text, std::wstring_view suffix) {
   if (name != text) name += L'-' + Digits(text);
   return name.append(suffix);
 }
-
-}  // namespace st::monitoring
