@@ -1,5 +1,6 @@
 #include "systeminfo/collecting_settings.h"
 
+#include "core/logging.h"
 #include "core/text.h"
 #include "systeminfo/settings_document.h"
 

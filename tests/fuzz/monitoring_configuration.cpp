@@ -1,9 +1,9 @@
 // "monitoring.json": its sections, its limits, the targets of its dumps, and the file names made from its texts.
 #include <cmath>
 
+#include "core/safe_file_name.h"
 #include "monitoring/configuration.h"
 #include "monitoring/dump_rules.h"
-#include "core/safe_file_name.h"
 #include "tests/fuzz/fuzz.h"
 
 namespace {
