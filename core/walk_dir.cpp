@@ -39,7 +39,8 @@ bool WalkDir(std::wstring_view root, const WalkDirEntryCallback& callback) {
     if (error == ERROR_SUCCESS) continue;
     const bool isRoot = folder.empty();
     // What vanishes meanwhile, never was there or is a file is no failure.
-    if (!IsAbsence(error) && error != ERROR_DIRECTORY) {
+    const bool isFile = isRoot && !isListed && !FolderExists(shownRoot);
+    if (!IsAbsence(error) && !isFile) {
       path.resize(folderLength);
       LOG_WARNING(L"WalkDir", L"%s cannot be listed%s, error %u", path.c_str(), isListed ? L" to its end" : L"", error);
     }
