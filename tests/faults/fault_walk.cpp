@@ -231,7 +231,7 @@ class Walk {
       const std::string name = ToUtf8(file);
       if (file.starts_with(L"\\temp")) m_fileProblems.push_back("left in the temporary folder: " + name);
       const std::string problem = FileProblem(m_folder + file);
-      if (!problem.empty()) m_fileProblems.push_back(name + ": " + problem);
+      if (!problem.empty()) m_fileProblems.push_back(std::string(name).append(": ").append(problem));
     }
     for (const std::wstring& file : before) {
       if (file.starts_with(L"\\temp") && !PathExists(m_folder + file)) {
