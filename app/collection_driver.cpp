@@ -84,7 +84,7 @@ void DeleteArchive(const std::wstring& archive) {
   if (DeleteFileW(ExtendedPath(archive).c_str())) return;
   const DWORD error = GetLastError();
   LOG_WARNING(kScope, L"Failed to delete generated zip file.");
-  LOG_WARNING(kScope, L"error %u", error);
+  LOG_TRACE(kScope, L"error %u", error);
 }
 
 void DeleteCollectedData(const std::wstring& folder) {

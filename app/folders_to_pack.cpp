@@ -95,7 +95,7 @@ std::wstring CopyInstallLogs(const std::wstring& outputFolder) {
   if (!CreateDirectoryW(ExtendedPath(target).c_str(), nullptr)) {
     const DWORD error = GetLastError();
     LOG_ERROR(kCopyInstallLogs, L"can't create install logs folder");
-    LOG_ERROR(kCopyInstallLogs, L"error %u", error);
+    LOG_TRACE(kCopyInstallLogs, L"error %u", error);
     return {};
   }
   LOG_TRACE(kCopyInstallLogs, L"install_logs folder %s", target.c_str());
@@ -108,7 +108,7 @@ std::wstring CopyInstallLogs(const std::wstring& outputFolder) {
     if (!CopyFileW(ExtendedPath(file).c_str(), ExtendedPath(copy).c_str(), FALSE)) {
       const DWORD error = GetLastError();
       LOG_ERROR(kCopyInstallLogs, L"Failed to copy file from %s to %s ", file.c_str(), copy.c_str());
-      LOG_ERROR(kCopyInstallLogs, L"error %u", error);
+      LOG_TRACE(kCopyInstallLogs, L"error %u", error);
     }
   }
   return target;

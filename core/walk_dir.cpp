@@ -38,7 +38,9 @@ bool WalkDir(std::wstring_view root, const WalkDirEntryCallback& callback) {
     if (isStopped) return true;
     if (error == ERROR_SUCCESS) continue;
     const bool isRoot = folder.empty();
-    if (!IsAbsence(error)) {  // what vanishes meanwhile, or never was there, is no failure
+    // What vanishes meanwhile, never was there or is a file is no failure.
+    const bool isFile = isRoot && !isListed && !FolderExists(shownRoot);
+    if (!IsAbsence(error) && !isFile) {
       path.resize(folderLength);
       LOG_WARNING(L"WalkDir", L"%s cannot be listed%s, error %u", path.c_str(), isListed ? L" to its end" : L"", error);
     }

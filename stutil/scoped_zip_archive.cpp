@@ -71,7 +71,7 @@ ScopedZipArchive::ScopedZipArchive(std::wstring_view archivePath) : m_writer(std
   m_writer.reset();
   constexpr wchar_t kScope[] = L"stutil::ScopedZipArchive::ScopedZipArchive";
   LOG_ERROR(kScope, L"error creating zip file %s", std::wstring(archivePath).c_str());
-  LOG_ERROR(kScope, L"error %u", error);
+  LOG_TRACE(kScope, L"error %u", error);
 }
 
 ScopedZipArchive::~ScopedZipArchive() {
@@ -81,7 +81,7 @@ ScopedZipArchive::~ScopedZipArchive() {
   if (isFinalized && error == ERROR_SUCCESS) return;
   constexpr wchar_t kScope[] = L"stutil::ScopedZipArchive::~ScopedZipArchive";
   LOG_ERROR(kScope, L"error on archive finalize");
-  LOG_ERROR(kScope, L"error %u", error);
+  LOG_TRACE(kScope, L"error %u", error);
 }
 
 bool ScopedZipArchive::IsOpen() const {

@@ -54,7 +54,7 @@ std::unique_ptr<SkylaneApi> LoadSkylaneApi() {
   const bool isComplete =
       std::apply([&](const auto&... entries) { return (Bind(*api, entries) && ...); }, kEntryPoints);
   if (isComplete) return api;
-  LOG_ERROR(L"stutil::LoadSkylaneApi", L"qxlink.dll cannot be loaded or is incomplete, error %u", GetLastError());
+  LOG_TRACE(L"stutil::LoadSkylaneApi", L"qxlink.dll cannot be loaded or is incomplete, error %u", GetLastError());
   return nullptr;
 }
 

@@ -26,7 +26,6 @@ std::optional<std::wstring> TypeOf(const ObjectCalls& calls, HANDLE process, uin
       calls.query(duplicate.Get(), kObjectTypeInformation, reply.data(), static_cast<ULONG>(reply.size()), nullptr);
   if (status < 0) {
     LOG_TRACE(kScope, L"Erorr m_ntQueryObject");
-    LOG_TRACE(kScope, L"status %x", static_cast<unsigned>(status));
     return std::nullopt;
   }
   const auto name =

@@ -17,14 +17,11 @@ constexpr DWORD kLongestPath = 32768;  // the usual 260 characters would cut the
 
 ModulesHelper::ModulesHelper(const wchar_t* library) : m_library(library) {
   if (!m_library) {
-    const DWORD error = GetLastError();
     LOG_TRACE(kConstructor, L"Can't load psapi.dll");
-    LOG_TRACE(kConstructor, L"error %u", error);
     return;
   }
   m_enumModulesEx = m_library.Resolve<decltype(m_enumModulesEx)>("EnumProcessModulesEx");
   if (m_enumModulesEx == nullptr) {
-    LOG_TRACE(kConstructor, L"no EnumProcessModulesEx, error %u", GetLastError());
     m_useEx = false;
     m_enumModules = m_library.Resolve<decltype(m_enumModules)>("EnumProcessModules");
     if (m_enumModules == nullptr) {
@@ -34,9 +31,7 @@ ModulesHelper::ModulesHelper(const wchar_t* library) : m_library(library) {
   }
   m_getModuleFileName = m_library.Resolve<decltype(m_getModuleFileName)>("GetModuleFileNameExW");
   if (m_getModuleFileName == nullptr) {
-    const DWORD error = GetLastError();
     LOG_TRACE(kConstructor, L"GetProcAddress(GetModuleFileNameExW)");
-    LOG_TRACE(kConstructor, L"error %u", error);
     return;
   }
   m_isSane = true;

@@ -107,7 +107,8 @@ RegistryKey::RegistryKey(HKEY parent, std::wstring_view path, REGSAM access, DWO
 }
 
 void RegistryKey::LogUnlessAbsent(const wchar_t* function, std::wstring_view path) const {
-  if (m_openError == ERROR_FILE_NOT_FOUND || m_openError == ERROR_PATH_NOT_FOUND) return;
+  constexpr DWORD kAbsence[] = {ERROR_FILE_NOT_FOUND, ERROR_PATH_NOT_FOUND, ERROR_INVALID_NAME};
+  if (std::find(std::begin(kAbsence), std::end(kAbsence), m_openError) != std::end(kAbsence)) return;
   LOG_WARNING(function, L"The key %s cannot be opened, error %u", std::wstring(path).c_str(), m_openError);
 }
 

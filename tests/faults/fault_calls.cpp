@@ -108,7 +108,7 @@ FARPROC CountedCall(FARPROC found, const char* name) {
 }  // namespace
 }  // namespace faults
 
-// NOLINTBEGIN(bugprone-reserved-identifier): the linker's own name for an import pointer
+// NOLINTBEGIN(bugprone-reserved-identifier,bugprone-macro-parentheses): the linker's own name for an import pointer
 #define ST_IMPORTED_CALL(name, ...)                                                          \
   extern "C" {                                                                               \
   decltype(&name) __imp_##name = &faults::Call<decltype(&name)>::Make<faults::row::name##_>; \
@@ -118,4 +118,4 @@ FARPROC CountedCall(FARPROC found, const char* name) {
     return faults::Call<decltype(&name)>::Make<faults::row::name##_> arguments;       \
   }
 ST_FAULT_TABLE(ST_IMPORTED_CALL, ST_PLAIN_CALL, ST_NO_CALL, ST_NO_CALL)
-// NOLINTEND(bugprone-reserved-identifier)
+// NOLINTEND(bugprone-reserved-identifier,bugprone-macro-parentheses)

@@ -81,6 +81,9 @@ constexpr Harmless kHarmless[] = {
     {row::BCryptCreateHash_, "", "a hash that begins behind the last one is never used"},
     {row::GetModuleFileNameW_, "", "a run-time library does not find the logging library; nobody is left to tell"},
     {row::IWbemClassObject_Get_, "running_tasks", "a property that its class does not deny is asked for"},
+    {row::GetProcAddress_, "running_tasks", "the fixed trace line names the step, without a number"},
+    {row::LoadLibraryExW_, "running_tasks", "the same"},
+    {row::NtQueryObject_, "running_tasks", "the same"},
     {row::PdhCollectQueryData_, "monitoring", "a sample that was not taken is no sample"},
     {row::timeBeginPeriod_, "monitoring", "the timers are as coarse as the system's"},
     {row::LoadLibraryExW_, "monitoring", "is tried once more, with the search in the library's own folder"},
@@ -228,7 +231,7 @@ class Walk {
       const std::string name = ToUtf8(file);
       if (file.starts_with(L"\\temp")) m_fileProblems.push_back("left in the temporary folder: " + name);
       const std::string problem = FileProblem(m_folder + file);
-      if (!problem.empty()) m_fileProblems.push_back(name + ": " + problem);
+      if (!problem.empty()) m_fileProblems.push_back(std::string(name).append(": ").append(problem));
     }
     for (const std::wstring& file : before) {
       if (file.starts_with(L"\\temp") && !PathExists(m_folder + file)) {
