@@ -104,7 +104,7 @@ TEST(Program, AReportReplacesTheTextAndStandsUnderItsNameOnlyWhenItIsWhole) {
   EXPECT_THAT(output.text, HasSubstr("r.html is written. Findings: 1.\n"));
   EXPECT_THAT(steps, testing::ElementsAre("Opening", "Judging", "Writing the report"));
   std::string html;
-  ASSERT_EQ(ReadWholeFile(report, 1 << 20, html), DWORD{ERROR_SUCCESS});
+  ASSERT_EQ(ReadWholeFile(report, 16 << 20, html), DWORD{ERROR_SUCCESS});
   EXPECT_THAT(html, HasSubstr("\"collector-failed\""));
   EXPECT_THAT(RunProgram({zip, L"-o", report, L"--json"}).text, testing::StartsWith("{"));
   EXPECT_FALSE(PathExists(report + L".partial"));
