@@ -116,8 +116,11 @@ int32_t AskLater(QxskylaneContext* context, QxskylaneDone done, void* user, bool
 // linked into a library, as GCC's is, leaves handles and memory behind with every unloading.
 void StayLoaded() {
   HMODULE self = nullptr;
-  GetModuleHandleExW(GET_MODULE_HANDLE_EX_FLAG_PIN | GET_MODULE_HANDLE_EX_FLAG_FROM_ADDRESS,
-                     reinterpret_cast<const wchar_t*>(&StayLoaded), &self);
+  if (GetModuleHandleExW(GET_MODULE_HANDLE_EX_FLAG_PIN | GET_MODULE_HANDLE_EX_FLAG_FROM_ADDRESS,
+                         reinterpret_cast<const wchar_t*>(&StayLoaded), &self)) {
+    return;
+  }
+  LOG_WARNING(L"qxlink::StayLoaded", L"the library cannot stay loaded, error %u", GetLastError());
 }
 
 }  // namespace
@@ -125,9 +128,9 @@ void StayLoaded() {
 int32_t qxskylane_init(QxskylaneContext** context) {
   if (context == nullptr) return QXSKYLANE_BAD_ARGUMENT;
   *context = nullptr;
-  StayLoaded();
   return Guarded([&] {
     auto made = std::make_unique<QxskylaneContext>();
+    StayLoaded();
     const int32_t result = made->Configure(OwnModuleFolder());
     if (result == QXSKYLANE_OK) *context = made.release();  // qxskylane_uninit takes it back
     return result;
