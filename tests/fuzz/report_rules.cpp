@@ -11,7 +11,7 @@ void FuzzOne(std::string_view bytes) {
     const std::string name(input.TakeLine());
     const std::string_view text = input.Rest().substr(0, input.Rest().find('\f'));
     if (report::IsDocumentName(name)) report::AddDocument(collection, name, text);
-    collection.fileNames.push_back(name);
+    collection.files.push_back({name, text.size()});
     input = Input(input.Rest().substr(std::min(text.size() + 1, input.Rest().size())));
   }
   report::SetCollectionTime(collection);
