@@ -7,7 +7,6 @@
 #include "core/json.h"
 #include "monitoring/dump_budget.h"
 #include "monitoring/dump_rules.h"
-#include "monitoring/sample_file.h"
 #include "monitoring/trigger_rules.h"
 
 namespace st::monitoring {

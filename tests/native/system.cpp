@@ -8,12 +8,13 @@
 namespace {
 
 wchar_t Upper(wchar_t c) {
-  return c >= L'a' && c <= L'z' ? static_cast<wchar_t>(c - L'a' + L'A') : c;
+  const bool isSmall = (c >= L'a' && c <= L'z') || (c >= 0xE0 && c <= 0xFE && c != 0xF7);
+  return isSmall ? static_cast<wchar_t>(c - 0x20) : c;
 }
 
 }  // namespace
 
-// Of the letters only those of ASCII are folded.
+// Of the letters only those of Latin-1 are folded.
 int CompareStringOrdinal(const wchar_t* left, int leftLength, const wchar_t* right, int rightLength, BOOL ignoreCase) {
   const std::wstring_view a(left, static_cast<size_t>(leftLength));
   const std::wstring_view b(right, static_cast<size_t>(rightLength));
