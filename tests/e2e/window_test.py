@@ -141,7 +141,7 @@ class WindowTest(unittest.TestCase):
         walk = ReportWalk(window, ENGLISH)
         walk.to_the_recording()
         walk.start_recording()
-        self.assertTrue(self.stage.is_raised())
+        wait_for("the logging to be raised", self.stage.is_raised)
         window.key("alt+F4")
         self.assertEnded(window)
 
