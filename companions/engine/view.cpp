@@ -324,7 +324,8 @@ double View::Scale() const {
 }
 
 void View::OnSize() {
-  if (m_session == nullptr || m_isDestroyed) return;
+  // A minimised window has the size of a title: neither the page's layout nor the picture is to follow it there.
+  if (m_session == nullptr || m_isDestroyed || IsIconic(m_window)) return;
   const SIZE size = ClientSize();
   const SIZE largest = LargestLayout(m_window);
   m_session->Resize(std::min(size.cx, largest.cx), std::min(size.cy, largest.cy), Scale());
@@ -336,7 +337,7 @@ void View::OnSize() {
 }
 
 void View::Present() {
-  if (m_surface.IsEmpty() || m_isDestroyed) return;
+  if (m_surface.IsEmpty() || m_isDestroyed || IsIconic(m_window)) return;
   if (!IsLayered()) {
     InvalidateRect(m_window, nullptr, FALSE);
   } else if (!m_surface.ShowLayered(m_window, ClientSize())) {
@@ -377,6 +378,7 @@ std::optional<LRESULT> View::OnFrameMessage(UINT message, WPARAM wparam, LPARAM 
     case WM_WINDOWPOSCHANGED:
     case WM_DPICHANGED:
       OnSize();
+      if (message == WM_SIZE && std::exchange(m_isMinimized, wparam == SIZE_MINIMIZED)) Present();
       return {};
     case WM_PAINT:
       if (IsLayered()) return {};

@@ -86,6 +86,7 @@ class View : public PageHost, public std::enable_shared_from_this<View> {
   FrameSurface m_surface;
   bool m_isDestroyed = false;
   bool m_hasFrames = false;
+  bool m_isMinimized = false;
   HtmlHostCallback m_host = nullptr;
   void* m_hostParam = nullptr;
   HtmlDebugOutput m_debugOutput = nullptr;
