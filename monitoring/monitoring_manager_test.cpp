@@ -23,7 +23,8 @@ std::string Counter(const std::string& id, const std::string& triggers, const st
          "}";
 }
 
-std::string Trigger(const std::string& id, int after, const std::string& condition, const std::string& actions = {}) {
+std::string TriggerText(const std::string& id, int after, const std::string& condition,
+                        const std::string& actions = {}) {
   return R"({"id":")" + id + R"(", "triggerAfter":)" + std::to_string(after) + R"(, "counterValue":50, "condition":")" +
          condition + R"(", "action":[)" + actions + "]}";
 }
@@ -69,7 +70,7 @@ class ManagerTest : public testing::Test {
 // Two collections a tick: the first is what the log shows, the second what is compared.
 TEST_F(ManagerTest, MatchesAreCountedInTotalAndTheRunEndsByItself) {
   m_scripts[L"c"] = {1, 60, 2, 40, 3, 70};
-  const auto manager = Manager(Document(Counter("c", R"("t")"), Trigger("t", 2, ">")));
+  const auto manager = Manager(Document(Counter("c", R"("t")"), TriggerText("t", 2, ">")));
   ASSERT_TRUE(manager->Init());
   EXPECT_TRUE(manager->Start());
   EXPECT_THAT(LinesOf(L"Tick"), ElementsAre(L"[c,t] UPDATE; cnt = 1; value = 1.000000",
@@ -82,7 +83,7 @@ TEST_F(ManagerTest, TheRunEndsWhenTheLastPairHasFired) {
   m_scripts[L"slow"] = std::vector<std::optional<double>>(20, 40.0);
   m_scripts[L"slow"].push_back(60.0);
   const auto manager =
-      Manager(Document(Counter("fast", R"("t")") + "," + Counter("slow", R"("t")"), Trigger("t", 1, ">")));
+      Manager(Document(Counter("fast", R"("t")") + "," + Counter("slow", R"("t")"), TriggerText("t", 1, ">")));
   ASSERT_TRUE(manager->Init());
   EXPECT_TRUE(manager->Start());
   EXPECT_THAT(LinesOf(L"Tick"), ElementsAre(L"[fast,t] UPDATE; cnt = 1; value = 60.000000", L"[fast,t] TRIGGER",
@@ -92,7 +93,7 @@ TEST_F(ManagerTest, TheRunEndsWhenTheLastPairHasFired) {
 
 TEST_F(ManagerTest, ATriggerThatIsListedTwiceMakesTwoPairs) {
   m_scripts[L"c"] = {60};
-  const auto manager = Manager(Document(Counter("c", R"("t","t")"), Trigger("t", 2, ">=")));
+  const auto manager = Manager(Document(Counter("c", R"("t","t")"), TriggerText("t", 2, ">=")));
   ASSERT_TRUE(manager->Init());
   EXPECT_TRUE(manager->Start());
   const std::vector<std::wstring> lines = LinesOf(L"Tick");
@@ -103,7 +104,7 @@ TEST_F(ManagerTest, ATriggerThatIsListedTwiceMakesTwoPairs) {
 
 TEST_F(ManagerTest, AFailedFirstCollectionIsLoggedAsZero) {
   m_scripts[L"c"] = {std::nullopt, 60};
-  const auto manager = Manager(Document(Counter("c", R"("t")", R"(, "saveToFile":true)"), Trigger("t", 1, ">")));
+  const auto manager = Manager(Document(Counter("c", R"("t")", R"(, "saveToFile":true)"), TriggerText("t", 1, ">")));
   ASSERT_TRUE(manager->Init());
   EXPECT_TRUE(manager->Start());
   EXPECT_THAT(LinesOf(L"Tick"), ElementsAre(L"[c,t] UPDATE; cnt = 1; value = 0.000000", L"[c,t] TRIGGER"));
@@ -111,7 +112,7 @@ TEST_F(ManagerTest, AFailedFirstCollectionIsLoggedAsZero) {
 }
 
 TEST_F(ManagerTest, ATriggerAfterNothingFiresOnTheFirstTickWhateverTheReading) {
-  const auto manager = Manager(Document(Counter("unknown counter", R"("t")"), Trigger("t", 0, "")));
+  const auto manager = Manager(Document(Counter("unknown counter", R"("t")"), TriggerText("t", 0, "")));
   ASSERT_TRUE(manager->Init());
   EXPECT_TRUE(manager->Start());
   EXPECT_THAT(LinesOf(L"Tick"), ElementsAre(L"[unknown counter,t] TRIGGER"));
@@ -119,7 +120,7 @@ TEST_F(ManagerTest, ATriggerAfterNothingFiresOnTheFirstTickWhateverTheReading) {
 
 TEST_F(ManagerTest, SamplesAreSavedBesideTheConfigurationUnderASafeName) {
   m_scripts[L"a/b"] = {1, 40, 2.5, 60};
-  const auto manager = Manager(Document(Counter("a/b", R"("t")", R"(, "saveToFile":true)"), Trigger("t", 1, ">")));
+  const auto manager = Manager(Document(Counter("a/b", R"("t")", R"(, "saveToFile":true)"), TriggerText("t", 1, ">")));
   ASSERT_TRUE(manager->Init());
   EXPECT_TRUE(manager->Start());
   WIN32_FIND_DATAW found;
@@ -155,7 +156,7 @@ TEST_F(ManagerTest, PairsThatTheQueueRefusesDoNotKeepTheRunFromEnding) {
   std::string never = Counter("never", R"("t","t")");
   never.replace(never.find(":5"), 2, ":0");
   for (const std::string& counters : {never + "," + Counter("c", R"("t")"), never}) {
-    const auto manager = Manager(Document(counters, Trigger("t", 1, ">")));
+    const auto manager = Manager(Document(counters, TriggerText("t", 1, ">")));
     ASSERT_TRUE(manager->Init());
     EXPECT_TRUE(manager->Start());
   }
@@ -182,8 +183,9 @@ TEST_F(ManagerTest, StopWhileAnActionRunsFinishesItsDumpAndBeginsNothingElse) {
   };
   const std::string action =
       R"({"id":"a", "type":"dump", "parameters":{"pid":)" + std::to_string(GetCurrentProcessId()) + "}}";
-  const auto manager = Manager(Document(
-      Counter("c", R"("t","never")"), Trigger("t", 1, ">", R"("a","a","a")") + "," + Trigger("never", 1, ""), action));
+  const auto manager =
+      Manager(Document(Counter("c", R"("t","never")"),
+                       TriggerText("t", 1, ">", R"("a","a","a")") + "," + TriggerText("never", 1, ""), action));
   ASSERT_TRUE(manager->Init());
   std::thread stopper([&] {
     WaitForSingleObject(begun.Get(), INFINITE);
@@ -203,7 +205,7 @@ TEST_F(ManagerTest, ThousandsOfCountersAndHugeIdsAreNoTrouble) {
   std::string counters = Counter("", R"("t")") + "," + Counter(std::string(100'000, 'x'), R"("t")");
   for (int i = 0; i < 10'000; ++i)
     counters += "," + Counter("counter " + std::to_string(i), R"("t")");
-  const auto manager = Manager(Document(counters, Trigger("t", 0, "")));
+  const auto manager = Manager(Document(counters, TriggerText("t", 0, "")));
   ASSERT_TRUE(manager->Init());
   const ULONGLONG begin = GetTickCount64();
   EXPECT_TRUE(manager->Start());
@@ -217,11 +219,11 @@ TEST_F(ManagerTest, WhatCannotBeUsedIsRefusedByInitWithAReason) {
     std::wstring framework;
     std::vector<const wchar_t*> lines;  // at error level, ends of them, in order
   } const rows[] = {
-      {Document(Counter("c", R"("t","u")"), Trigger("t", 1, ">")),
+      {Document(Counter("c", R"("t","u")"), TriggerText("t", 1, ">")),
        real,
        {L"PdhAddCounter -1073738823", L"Not a valid configuration"}},
-      {Document("", Trigger("t", 1, ">", R"("a")")), real, {L"Not a valid configuration"}},
-      {Document(Counter("c", R"("t")"), Trigger("t", 1, ">") + "," + Trigger("t", 2, ">")),
+      {Document("", TriggerText("t", 1, ">", R"("a")")), real, {L"Not a valid configuration"}},
+      {Document(Counter("c", R"("t")"), TriggerText("t", 1, ">") + "," + TriggerText("t", 2, ">")),
        m_folder.Path(L"framework.dll"),
        {L"PdhAddCounter -1073738823", L"section triggers is cut short by a bad element", L"framework.dll: 126",
         L"Failed to init EQ : 126"}},

@@ -33,13 +33,13 @@ std::vector<std::string> Lines(const Comparison& comparison) {
   return lines;
 }
 
-struct Row {
+struct PairOfDocuments {
   const char* before;
   const char* after;
   std::vector<std::string> changes;
 };
 
-const Row kRows[] = {
+const PairOfDocuments kRows[] = {
     // Rows are paired by name, whatever their order and the case of letters.
     {R"({"services": [{"Name": "a", "StartMode": "Auto"}, {"Name": "b", "State": "Running"}, {"Name": "c"}]})",
      R"({"services": [{"Name": "d"}, {"Name": "B", "State": "Stopped"}, {"Name": "A", "StartMode": "Auto"}]})",
@@ -88,7 +88,7 @@ const Row kRows[] = {
 };
 
 TEST(Comparison, PairsRowsByTheirNamesAndPassesOverWhatDoesNotLast) {
-  for (const Row& row : kRows) {
+  for (const PairOfDocuments& row : kRows) {
     SCOPED_TRACE(row.before);
     const Comparison comparison = CompareDocuments(Parse(row.after), Parse(row.before));
     EXPECT_THAT(Lines(comparison), testing::UnorderedElementsAreArray(row.changes));
@@ -98,7 +98,7 @@ TEST(Comparison, PairsRowsByTheirNamesAndPassesOverWhatDoesNotLast) {
 }
 
 TEST(Comparison, SurvivesEveryTypeInEveryPlace) {
-  for (const Row& row : kRows) {
+  for (const PairOfDocuments& row : kRows) {
     ForEachReplacement(Parse(row.before), [&](const Json::Value& changed) {
       const Comparison comparison = CompareDocuments(Parse(row.after), changed);
       EXPECT_NO_THROW(FindingsAsText({}, &comparison));

@@ -4,8 +4,8 @@ clang_tidy.py BUILD_FOLDER NATIVE_BUILD_FOLDER [FILE…]
 
 Most of clang-tidy's time goes into windows.h, the C++ library and GoogleTest, which it parses and searches anew for every
 source. Sources are therefore checked in groups: one translation unit that includes several of them. Sources that
-declare the same local name do not go into one group, and a group that does not compile is checked file by file. A group that
-has not changed since it passed is not checked again.
+declare the same local name do not go into one group, and what keeps a group from compiling is checked by itself. A group
+that has not changed since it passed is not checked again.
 """
 
 import concurrent.futures
@@ -26,6 +26,8 @@ CROSS_OPTIONS = ['--target=x86_64-w64-mingw32', '-nostdinc++', f'-isystem{TOOLCH
                  '-Wno-unknown-warning-option', '-Wno-unused-command-line-argument']
 # The path-sensitive analyser takes most of the time and finds little in tests.
 TEST_CHECKS = '--checks=-clang-analyzer-*'
+# What every program, library or fuzz target defines for itself.
+ENTRY_POINTS = ('wmain', 'main', 'DllMain', 'FuzzOne')
 
 
 def is_test(path):
@@ -94,6 +96,14 @@ def groups(files):
     return [group['files'] for group in found]
 
 
+def part(path, number):
+    """A source as part of a unit."""
+    lines = [f'#define {name} {name}{number}' for name in ENTRY_POINTS]
+    lines.append(f'#include "{path}"  // NOLINT(bugprone-suspicious-include)')
+    lines += [f'#undef {name}' for name in ENTRY_POINTS]
+    return '\n'.join(lines) + '\n'
+
+
 class Checker:
     def __init__(self, build, options):
         self.options = options
@@ -113,7 +123,11 @@ class Checker:
         options = dict.fromkeys(option for path in files for option in self.options[path])
         run = self.run(files, name, options, [TEST_CHECKS] if is_test(files[0]) else [])
         if len(files) > 1 and 'clang-diagnostic-error' in run.stdout:
-            return all([self.check([path]) for path in files])
+            failed = re.findall(r'^(.*?):\d+:\d+: error: .*clang-diagnostic-error', run.stdout, re.M)
+            alone = [path for path in files if str(ROOT / path) in failed]
+            others = [path for path in files if path not in alone]
+            parts = [[path] for path in alone or files] + ([others] if alone and others else [])
+            return all([self.check(part) for part in parts])
         if run.returncode != 0:
             print(run.stdout, run.stderr, 'lint: ' + ' '.join(files), sep='\n', file=sys.stderr, flush=True)
             return False
@@ -125,7 +139,7 @@ class Checker:
         if len(files) > 1:
             # By this name the path-sensitive analyser knows that what the source includes is not a header.
             source = self.folder / f'UnifiedSource-{name}.cpp'
-            source.write_text(''.join(f'#include "{path}"  // NOLINT(bugprone-suspicious-include)\n' for path in files))
+            source.write_text(''.join(part(path, number) for number, path in enumerate(files)))
         try:
             command = ['clang-tidy', '--quiet', *checks, str(source), '--', *options]
             return subprocess.run(command, cwd=ROOT, capture_output=True, text=True)
