@@ -6,6 +6,7 @@
 Without --long a few calls of each function fail, each with one error; with it all of them, each with every error.
 """
 import argparse
+import contextlib
 import json
 import pathlib
 import re
@@ -50,7 +51,7 @@ class Stage:
         (folder / "upload.bin").write_bytes(bytes(range(256)) * 1000)
 
     def walk(self, limit, *arguments):
-        """Returns (exit code, lines)."""
+        """Returns (exit code, lines). A walk that does not end has no code, and its last line is what Linux says of it."""
         with open(self.folder / "out.txt", "wb") as out:
             process = subprocess.Popen([*LAUNCHER, windows_path(self.folder / "fault_walk.exe"), *arguments],
                                        cwd=self.folder, env=ENVIRONMENT, stdin=subprocess.DEVNULL, stdout=out,
@@ -58,11 +59,20 @@ class Stage:
             try:
                 code = process.wait(limit)
             except subprocess.TimeoutExpired:
-                code = None
+                code, state = None, process_state(process.pid)
             finally:
                 process.kill()
                 process.wait()
-        return code, (self.folder / "out.txt").read_text(encoding="utf-8", errors="replace").splitlines()
+        lines = (self.folder / "out.txt").read_text(encoding="utf-8", errors="replace").splitlines()
+        return code, lines if code is not None else [*lines, state]
+
+
+def process_state(pid):
+    """Tells a walk that waits from one that is stopped: Wine stops a process while another one reads its memory."""
+    with contextlib.suppress(OSError):
+        status = pathlib.Path(f"/proc/{pid}/status").read_text(encoding="utf-8")
+        return ", ".join(re.findall(r"^(?:State|Threads|TracerPid):.*", status, re.M)).replace("\t", " ")
+    return "gone"
 
 
 def walk_scenario(stage, scenario, arguments, limit):

@@ -61,6 +61,7 @@ class Window:
             x, y, width, height = self.place()
             wait_for("the picture", lambda: any(self.screen.colour(x + width // 2, y + height // 2)))
             self.painted_after = time.monotonic() - self.started
+            wait_for("the keyboard", self._has_keyboard)  # the window manager gives it when the window is shown already
             self.page = wait_for("the page", self._connect)
             wait_for("the first section", lambda: self.read("document.readyState") == "complete")
         except BaseException:
@@ -90,6 +91,9 @@ class Window:
         if self.process.poll() is not None:
             raise AssertionError(f"the program has ended with {self.process.returncode}")
         return next(iter(self._visible()), None)
+
+    def _has_keyboard(self):
+        return self._xdotool("getwindowfocus").strip() == self.handle
 
     def _visible(self):
         with contextlib.suppress(AssertionError):  # a window may go while it is asked for its name
