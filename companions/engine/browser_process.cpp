@@ -3,7 +3,7 @@
 #include <bcrypt.h>
 #include <lmcons.h>
 
-#include <chrono>
+#include <utility>
 #include <vector>
 
 #include "companions/engine/browser_command.h"
@@ -177,6 +177,9 @@ bool BrowserProcess::CreateInJob(std::wstring commandLine, const Pipes& pipes, s
     error = Format(L"the browser cannot be started, error %u", GetLastError());
     return false;
   }
+  m_isStarted = true;
+  // Of a Unix program there are no handles. What stands in their place may be the number of any handle of this process.
+  if (m_isUnix) return true;
   const KernelHandle thread(process.hThread);
   m_process.Reset(process.hProcess);
   return true;
@@ -228,10 +231,12 @@ void BrowserProcess::End() noexcept {
   if (m_job) TerminateJobObject(m_job.Get(), 1);
   m_job.Reset();
   if (m_process) WaitForSingleObject(m_process.Get(), kEndTimeout);
-  const bool isWatched = m_isUnix && m_process;
   m_process.Reset();
-  if (isWatched) m_markHandle.Reset();  // the shell ends the browser and deletes the profile when the mark has gone
-  if (m_profile.empty() || isWatched) return;
+  if (std::exchange(m_isStarted, false) && m_isUnix) {
+    m_markHandle.Reset();  // the shell ends the browser and deletes the profile when the mark has gone
+    m_profile.clear();
+  }
+  if (m_profile.empty()) return;
   // Its other processes may hold files of the profile for a moment longer.
   for (const ULONGLONG start = GetTickCount64(); !DeleteFolder(m_profile, true); Sleep(kPollInterval)) {
     if (GetTickCount64() - start > kEndTimeout) break;

@@ -48,6 +48,7 @@ class BrowserProcess {
   bool m_isUnix = false;
   bool m_usesPort = false;
   bool m_runsWithoutSandbox = false;
+  bool m_isStarted = false;
   KernelHandle m_job;      // closing its last handle ends all processes in it
   KernelHandle m_process;  // invalid for a Unix program
   KernelHandle m_fromBrowser;
