@@ -65,9 +65,10 @@ ProductLogging::ProductLogging(const std::wstring& folder)
 
 bool ProductLogging::Activate() const {
   const std::lock_guard lock(g_lock);
-  const bool kept = KeepFormer();
+  bool isFileKept = true;
+  const bool kept = KeepFormer(isFileKept);
   const bool block = ActivateCSTLogs(kRaisedLevel);
-  const bool file = SetLogLevel(kRaisedDepth, kRaisedLevels);
+  const bool file = isFileKept && SetLogLevel(kRaisedDepth, kRaisedLevels);
   LOG_TRACE(kActivateScope, L"enabled logs");
   return kept && block && file;
 }
@@ -95,7 +96,8 @@ bool ProductLogging::Restore() const {
 }
 
 // Before the first change. A marker that is there already tells of the settings before an earlier activation: it stays.
-bool ProductLogging::KeepFormer() const {
+// `isFileKept` is false when the file is there and could not be read: raised a moment later, it could not be put back.
+bool ProductLogging::KeepFormer(bool& isFileKept) const {
   if (PathExists(m_marker)) return true;
   RaisedLogging former;
   ChangeControlBlock([&former](size_t, const std::string& name, uint32_t level) {
@@ -103,7 +105,13 @@ bool ProductLogging::KeepFormer() const {
     return level;
   });
   std::string loggerXml;
-  if (ReadWholeFile(m_loggerXml, kLargestFile, loggerXml) == ERROR_SUCCESS) former.loggerXml = std::move(loggerXml);
+  const DWORD readError = ReadWholeFile(m_loggerXml, kLargestFile, loggerXml);
+  if (readError == ERROR_SUCCESS) former.loggerXml = std::move(loggerXml);
+  isFileKept = readError == ERROR_SUCCESS || readError == ERROR_FILE_NOT_FOUND;
+  if (!isFileKept) {
+    LOG_ERROR(kScope, L"Can't load endpoint logs [path %s], error %d; they stay as they are", m_loggerXml.c_str(),
+              readError);
+  }
   const DWORD error = WriteWholeFile(m_marker, WriteRaisedLogging(former));
   if (error == ERROR_SUCCESS) return true;
   LOG_ERROR(kActivateScope, L"the former settings cannot be kept in %s, error %d", m_marker.c_str(), error);

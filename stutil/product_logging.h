@@ -35,7 +35,7 @@ class ProductLogging {
   const std::wstring& MarkerPath() const { return m_marker; }
 
  private:
-  bool KeepFormer() const;
+  bool KeepFormer(bool& isFileKept) const;
   bool PutBack(const std::string& marker) const;
   bool PutBackLoggerXml(const std::string& former) const;
   bool Write(const std::string& text) const;

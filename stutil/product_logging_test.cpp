@@ -107,6 +107,16 @@ TEST_F(ProductLoggingTest, OneHalfIsDoneWhenTheOtherFails) {
   EXPECT_FALSE(PathExists(m_logging.MarkerPath()));
 }
 
+TEST_F(ProductLoggingTest, AFileThatCannotBeReadIsLeftAlone) {
+  const std::string before = Read(m_file);
+  {
+    const KernelHandle held(CreateFileW(m_file.c_str(), GENERIC_READ, 0, nullptr, OPEN_EXISTING, 0, nullptr));
+    EXPECT_FALSE(m_logging.Activate());
+  }
+  EXPECT_THAT(m_product.Levels(3), ElementsAre(2, 2, 2));
+  EXPECT_EQ(Read(m_file), before);
+}
+
 TEST_F(ProductLoggingTest, BlockThatClaimsMoreComponentsThanItHoldsIsChangedToItsEndOnly) {
   m_product.Block().componentCount = 0xFFFFFFFF;
   EXPECT_TRUE(m_logging.Activate());
