@@ -122,8 +122,9 @@ class Checker:
         # The options that differ between targets (folders of libraries, what is exported) do not disturb each other.
         options = dict.fromkeys(option for path in files for option in self.options[path])
         run = self.run(files, name, options, [TEST_CHECKS] if is_test(files[0]) else [])
-        if len(files) > 1 and 'clang-diagnostic-error' in run.stdout:
-            failed = re.findall(r'^(.*?):\d+:\d+: error: .*clang-diagnostic-error', run.stdout, re.M)
+        # Some of what only the company of others brings about is no error to the compiler, but a warning that counts as one.
+        failed = re.findall(r'^(.*?):\d+:\d+: error: .*\[clang-diagnostic-', run.stdout, re.M)
+        if len(files) > 1 and failed:
             alone = [path for path in files if str(ROOT / path) in failed]
             others = [path for path in files if path not in alone]
             parts = [[path] for path in alone or files] + ([others] if alone and others else [])
