@@ -48,9 +48,9 @@ class UnixWatchTest(unittest.TestCase):
             watches = {}
             for name in ("kept", "deleted", "aged", "slept"):
                 profile = pathlib.Path(folder) / f"st-engine-{name}"
-                profile.mkdir()
                 mark = pathlib.Path(f"{profile}.life")
-                mark.touch()
+                mark.touch()  # before the folder, which another watch would take for an orphan
+                profile.mkdir()
                 watches[name] = (profile, mark, subprocess.Popen(
                     ["sh", "-c", (SOURCE / "companions/engine/unix_watch.sh").read_text(), "watch", mark, profile, "sleep", "60"]))
             try:
@@ -184,7 +184,7 @@ class EngineTest(unittest.TestCase):
         for _ in range(10):
             self.assertEqual(host.ask("call many [1000]", "called"), "1 1000")
         print(f"a call of the page takes {(time.monotonic() - start) / 10:.2f} ms", file=sys.stderr)
-        self.assertEqual(host.ask("call functions [500]", "called"), "1 500")
+        self.assertEqual(host.ask("call functions [100]", "called"), "1 100")
         start = time.monotonic()
         for _ in range(200):
             host.send("call many [0]")
@@ -222,7 +222,7 @@ class EngineTest(unittest.TestCase):
         host.send(f"post {WM_KEYDOWN} {VK_TAB} 0")
         self.assertTrue(host.wait_for("print").startswith("blur") or host.wait_for("print").startswith("blur"))
 
-    def test_input_is_seen_on_the_screen_within_a_tenth_of_a_second(self):
+    def test_input_is_seen_on_the_screen(self):
         host = self.open("addEventListener('mousedown', () => document.documentElement.style.background = '#ff0000')")
         host.wait_for("shown")
         while host.ask("pixel 400 300", "pixel") != "16 32 48":
