@@ -175,6 +175,14 @@
     console.error('window.open: a page cannot open windows');
     return null;
   };
+  // The browser would stop the page until the engine has dismissed its dialog, which it refuses to a page that is being left.
+  const dismissed = (result) => (message = '') => {
+    console.warn('a dialog was not shown: ' + message);
+    return result;
+  };
+  globalThis.alert = dismissed(undefined);
+  globalThis.confirm = dismissed(false);
+  globalThis.prompt = dismissed(null);
   const within = (event, role) => event.target instanceof Element && event.target.closest(`[role~="${role}"]`);
   addEventListener('mousedown', (event) => {
     const isControl = event.target instanceof Element && event.target.closest('a, button, input, select, textarea');

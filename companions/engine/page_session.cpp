@@ -162,7 +162,7 @@ void PageSession::OnEvent(const DevToolsMessage& event) {
     OnFrame(params);
   } else if (event.method == "Page.loadEventFired") {
     m_isLoaded = true;
-  } else if (event.method == "Page.javascriptDialogOpening") {
+  } else if (event.method == "Page.javascriptDialogOpening") {  // of a frame, or before unloading
     m_host.Report(HTML_SUBSYSTEM_SCRIPT, HTML_WARNING, L"a dialog was not shown: " + ToWide(TextOf(params, "message")));
     m_client->Send("Page.handleJavaScriptDialog", With("accept", TextOf(params, "type") == "alert"));
   } else if (event.method == "Inspector.targetCrashed" || event.method == "Inspector.detached") {

@@ -237,12 +237,14 @@ class EngineTest(unittest.TestCase):
         host = self.open("""
             function leave(address) { location.href = address; }
             function pop() { return String(open('https://example.com/')); }
-            function ask() { return String(confirm('sure?')); }""")
+            function ask() { return String(confirm('sure?')); }
+            function others() { return [String(alert('stop')), String(prompt('name?', 'x'))]; }""")
         host.wait_for("shown")
         for address in ("https://example.com/", "http://127.0.0.1:1/", "this://app/nothing.htm"):
             host.ask(f'call leave ["{address}"]', "called")
         self.assertEqual(host.ask("call pop []", "called"), '1 "null"')
         self.assertEqual(host.ask("call ask []", "called"), '1 "false"')
+        self.assertEqual(host.ask("call others []", "called"), '1 ["undefined","null"]')
         time.sleep(0.5)
         self.assertEqual(host.ask("call ask []", "called"), '1 "false"')
         # Other ways to leave, by what no request is made for, and by pages that are not there.
@@ -255,8 +257,8 @@ class EngineTest(unittest.TestCase):
                 self.assertLess(time.monotonic(), deadline, way)
                 time.sleep(0.1)
         text = "\n".join(host.lines)
-        for report in ("outside of the page: https://example.com/", "a page cannot open windows", "a dialog was not shown",
-                       "the page went to 'about:blank'; it is loaded again", "missing.htm"):
+        for report in ("outside of the page: https://example.com/", "a page cannot open windows",
+                       "a dialog was not shown: sure?", "a dialog was not shown: name?", "the page went to 'about:blank'; it is loaded again", "missing.htm"):
             self.assertIn(report, text)
 
     def test_page_cannot_have_other_windows(self):
