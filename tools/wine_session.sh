@@ -20,8 +20,14 @@ st_wine_up() {
     wineserver -w < /dev/null > /dev/null 2>&1
     touch "$WINEPREFIX/st-ready"
   fi
-  wineserver -p600 < /dev/null > /dev/null 2>&1 || true
-  wine cmd /c exit < /dev/null > /dev/null 2>&1
+  # The server of a session before this one may just be ending, and takes the first program with it.
+  for _ in 1 2 3; do
+    wineserver -p600 < /dev/null > /dev/null 2>&1 || true
+    wine cmd /c exit < /dev/null > /dev/null 2>&1 && return
+    sleep 1
+  done
+  echo "wine_session.sh: Wine does not start a program in $WINEPREFIX; try: wine cmd /c exit" >&2
+  return 1
 }
 
 st_wine_down() {
