@@ -24,9 +24,7 @@ FILES_IN_A_GROUP = 16
 TOOLCHAIN = sorted(pathlib.Path('/usr/lib/gcc/x86_64-w64-mingw32').glob('*-posix/include/c++'))[-1]
 CROSS_OPTIONS = ['--target=x86_64-w64-mingw32', '-nostdinc++', f'-isystem{TOOLCHAIN}', f'-isystem{TOOLCHAIN}/x86_64-w64-mingw32',
                  '-Wno-unknown-warning-option', '-Wno-unused-command-line-argument']
-# The path-sensitive analyser takes most of the time. A third of its usual limit of states in a function halves that.
-ANALYSER_OPTIONS = ['-Xclang', '-analyzer-config', '-Xclang', 'max-nodes=75000']
-# It finds little in tests.
+# The path-sensitive analyser takes most of the time and finds little in tests.
 TEST_CHECKS = '--checks=-clang-analyzer-*'
 # What every program, library or fuzz target defines for itself.
 ENTRY_POINTS = ('wmain', 'main', 'DllMain', 'FuzzOne')
@@ -98,7 +96,7 @@ def groups(files):
     return [group['files'] for group in found]
 
 
-def part(path, number):
+def as_part(path, number):
     """A source as part of a unit."""
     lines = [f'#define {name} {name}{number}' for name in ENTRY_POINTS]
     lines.append(f'#include "{path}"  // NOLINT(bugprone-suspicious-include)')
@@ -142,9 +140,9 @@ class Checker:
         if len(files) > 1:
             # By this name the path-sensitive analyser knows that what the source includes is not a header.
             source = self.folder / f'UnifiedSource-{name}.cpp'
-            source.write_text(''.join(part(path, number) for number, path in enumerate(files)))
+            source.write_text(''.join(as_part(path, number) for number, path in enumerate(files)))
         try:
-            command = ['clang-tidy', '--quiet', *checks, str(source), '--', *options, *ANALYSER_OPTIONS]
+            command = ['clang-tidy', '--quiet', *checks, str(source), '--', *options]
             return subprocess.run(command, cwd=ROOT, capture_output=True, text=True)
         finally:
             if len(files) > 1:

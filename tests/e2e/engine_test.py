@@ -184,7 +184,7 @@ class EngineTest(unittest.TestCase):
         for _ in range(10):
             self.assertEqual(host.ask("call many [1000]", "called"), "1 1000")
         print(f"a call of the page takes {(time.monotonic() - start) / 10:.2f} ms", file=sys.stderr)
-        self.assertEqual(host.ask("call functions [100]", "called"), "1 100")
+        self.assertEqual(host.ask("call functions [500]", "called"), "1 500")
         start = time.monotonic()
         for _ in range(200):
             host.send("call many [0]")
@@ -258,7 +258,8 @@ class EngineTest(unittest.TestCase):
                 time.sleep(0.1)
         text = "\n".join(host.lines)
         for report in ("outside of the page: https://example.com/", "a page cannot open windows",
-                       "a dialog was not shown: sure?", "a dialog was not shown: name?", "the page went to 'about:blank'; it is loaded again", "missing.htm"):
+                       "a dialog was not shown: sure?", "a dialog was not shown: name?",
+                       "the page went to 'about:blank'; it is loaded again", "missing.htm"):
             self.assertIn(report, text)
 
     def test_page_cannot_have_other_windows(self):
